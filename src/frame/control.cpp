@@ -1,0 +1,3 @@
+#include "ssaopt/frame/control.h"
+
+void KvCControl::stopTimeAndEmitMessage(BxCXString&) {}
