@@ -151,4 +151,11 @@ TEST(Graph, PayloadGraphKeepsPayloadsAndCopiesShape) {
   EXPECT_EQ(copy.target(copy.first_adj_edge(ca)), cb);
   G.clear();
   EXPECT_EQ(copy.number_of_edges(), 1);
+
+  GRAPH<int*, const char*> assigned;
+  assigned.new_node(&two);
+  assigned = copy;
+  ASSERT_EQ(assigned.number_of_nodes(), 2);
+  EXPECT_EQ(assigned.inf(assigned.first_node()), &one);
+  EXPECT_STREQ(assigned.inf(assigned.first_edge()), "ab");
 }

@@ -326,8 +326,8 @@ public:
   GRAPH& operator=(const GRAPH& other) {
     if (this != &other) {
       graph::operator=(other);
-      m_NodeInf.clear();
-      m_EdgeInf.clear();
+      m_NodeInf = node_array<N>();
+      m_EdgeInf = edge_array<E>();
       copyPayloadsFrom(other);
     }
     return *this;

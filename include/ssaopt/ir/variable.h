@@ -1,0 +1,143 @@
+// Variables of the generated code. Clients derive their variables from KvCCfgVariable and answer the
+// questions only they can (data type, scaling, saturation, initial value); renaming creates one
+// KvCSSAVariable per definition, which asks its original variable those questions and carries its own
+// value range. Constant propagation keeps each variable's current lattice value here, adjusted to what
+// the variable can hold.
+#pragma once
+
+#include <cstdint>
+
+#include "ssaopt/frame/containers.h"
+#include "ssaopt/frame/graph.h"
+#include "ssaopt/frame/memory.h"
+#include "ssaopt/ir/forward.h"
+#include "ssaopt/values/value.h"
+
+class KV_DataType;
+class KV_Scaling;
+
+class KvCCfgVariable {
+public:
+  SSAOPT_MODULE_ALLOCATED
+
+  KvCCfgVariable();
+  // A copy would leave two owners of the current value; the library never copies a variable.
+  KvCCfgVariable(const KvCCfgVariable&) = delete;
+  KvCCfgVariable& operator=(const KvCCfgVariable&) = delete;
+
+  // Virtual operations, in slot order.
+  virtual ~KvCCfgVariable();
+  // Only SSA variables keep a range: these do nothing, or give null, on other variables.
+  virtual void setMinValueAndDestroyOld(KvCCfgValue& value);
+  virtual void setMaxValueAndDestroyOld(KvCCfgValue& value);
+  virtual KvCCfgValue* getMinValue() const;
+  virtual KvCCfgValue* getMaxValue() const;
+  virtual const KV_DataType* getDataType() const = 0;
+  // Null for an unscaled variable.
+  virtual const KV_Scaling* getScaling() const = 0;
+  virtual bool isUpperBorderSaturated() const = 0;
+  virtual bool isLowerBorderSaturated() const = 0;
+  virtual double getUpperLimit() const = 0;
+  virtual double getLowerLimit() const = 0;
+  // Read only; the library neither keeps nor deletes it. The base gives an undetermined value.
+  virtual const KvCCfgValue* getInitValue() const;
+  virtual bool isOutput() const;
+  virtual KvCCfgSFVariable* isSFVariable();
+  virtual KvCSSAVariable* isSSAVariable();
+
+  std::uint32_t getIndex() const { return m_Index; }
+  static void boot();
+
+  // The current value, still owned by the variable.
+  KvCCfgValue* getValue() const { return m_pValue; }
+  // Adjusts `value` in place to what the variable can hold and stores a copy as the current value.
+  // The value object replaced is not deleted: a caller that fetched it with getValue() owns it now.
+  void setVarValueAndAdjustCfgValue(KvCCfgValue& value);
+  // Clamps the number of `value` (whatever its kind) to the saturated borders; true when it changed.
+  bool ConsiderSaturation(KvCCfgValue& value) const;
+  bool isScaled() const;
+
+  // The SSA versions that stand for this variable while renaming walks the dominator tree.
+  void pushSSAReplacement(KvCCfgVariable* pReplacement) { m_SSAReplacements.push(pReplacement); }
+  // The stack must not be empty.
+  KvCCfgVariable* popSSAReplacement() { return m_SSAReplacements.pop(); }
+  // Null when the stack is empty.
+  KvCCfgVariable* topSSAReplacement() const;
+
+  KvCCfgVariable* getNonVirtualAlias() const { return m_pNonVirtualAlias; }
+  void setNonVirtualAlias(KvCCfgVariable* pAlias) { m_pNonVirtualAlias = pAlias; }
+  void appendVirtualAlias(KvCCfgVariable* pAlias) { m_VirtualAliases.insert(pAlias); }
+
+  // Array and volatile variables are never constant: marking one drops its current value.
+  bool isArray() const { return m_IsArray; }
+  void markAsArray();
+  bool isVolatile() const { return m_IsVolatile; }
+  void markAsVolatile();
+  bool isErasable() const { return m_IsErasable; }
+  void markAsErasable() { m_IsErasable = true; }
+
+  void appendUse(ssaopt::node v) { m_Uses.insert(v); }
+  // Removes `v` from the uses and returns how many are left.
+  int delUse(ssaopt::node v);
+  ssaopt::set<ssaopt::node> getUses() const { return m_Uses; }
+  int countUses() const { return static_cast<int>(m_Uses.size()); }
+  void clearUses() { m_Uses.clear(); }
+  // The uses of this variable and of its virtual aliases (one level).
+  ssaopt::set<ssaopt::node> getAllUses() const;
+  // countUses() plus that of every virtual alias: a node used by both counts twice.
+  int countAllUses() const;
+
+protected:
+  bool isNeverConstant() const { return m_IsArray || m_IsVolatile; }
+  // Brings a constant that saturation left alone to the variable's representation: the scaling's
+  // represented value when scaled, else the data type's value set (a Boolean becomes 0 or 1).
+  void fitConstant(KvCCfgValue& value) const;
+
+private:
+  void dropValueToNonConstant();
+
+  static std::uint32_t s_GlobIndexCnt;
+
+  std::uint32_t m_Index;
+  ssaopt::stack<KvCCfgVariable*> m_SSAReplacements;
+  KvCCfgValue* m_pValue;
+  ssaopt::set<ssaopt::node> m_Uses;
+  bool m_IsArray = false;
+  bool m_IsErasable = false;
+  bool m_IsVolatile = false;
+  KvCCfgVariable* m_pNonVirtualAlias;
+  ssaopt::set<KvCCfgVariable*> m_VirtualAliases;
+};
+
+class KvCSSAVariable : public KvCCfgVariable {
+public:
+  // A new variable index; takes over the array, erasable and volatile marks of `var` and leads to
+  // the original variable even when `var` is itself an SSA variable.
+  explicit KvCSSAVariable(KvCCfgVariable* var);
+
+  ~KvCSSAVariable() override;
+  // Replace the bound by a copy of `value` adjusted to the variable; `value` itself stays unchanged.
+  void setMinValueAndDestroyOld(KvCCfgValue& value) override;
+  void setMaxValueAndDestroyOld(KvCCfgValue& value) override;
+  KvCCfgValue* getMinValue() const override { return m_pMinValue; }
+  KvCCfgValue* getMaxValue() const override { return m_pMaxValue; }
+  // The client's questions go to the original variable.
+  const KV_DataType* getDataType() const override;
+  const KV_Scaling* getScaling() const override;
+  bool isUpperBorderSaturated() const override;
+  bool isLowerBorderSaturated() const override;
+  double getUpperLimit() const override;
+  double getLowerLimit() const override;
+  const KvCCfgValue* getInitValue() const override;
+  KvCSSAVariable* isSSAVariable() override { return this; }
+
+  void setOrigVar(KvCCfgVariable* var);
+  KvCCfgVariable* getOrigVar() const { return m_pOrigVar; }
+
+private:
+  void replaceBound(KvCCfgValue*& pBound, const KvCCfgValue& value);
+
+  KvCCfgVariable* m_pOrigVar = nullptr;
+  KvCCfgValue* m_pMinValue;
+  KvCCfgValue* m_pMaxValue;
+};

@@ -1,0 +1,167 @@
+// Variables: the current value with its adjustment to what a variable can hold, the SSA versions'
+// value ranges, the replacement stack, aliases and use sets.
+#include "ssaopt/ir/variable.h"
+
+#include "ssaopt/frame/control.h"
+#include "ssaopt/frame/report.h"
+#include "ssaopt/frame/types.h"
+#include "ssaopt/values/arithmetic.h"
+
+namespace {
+
+// Source lines the reports below are filed under; the host turns them into error codes that logs
+// and tests match, so they stay fixed whatever happens to this file.
+constexpr int kLineDelUse = 212;  // where delUse checks that the node is a use
+
+// The initial value of a variable whose class has none of its own; nobody may change it.
+const KvCCfgValue kUndeterminedInitValue;
+
+}  // namespace
+
+std::uint32_t KvCCfgVariable::s_GlobIndexCnt = 0;
+
+void KvCCfgVariable::boot() { s_GlobIndexCnt = 0; }
+
+KvCCfgVariable::KvCCfgVariable()
+    : m_Index(ssaopt::drawIndex(s_GlobIndexCnt)), m_pValue(new KvCCfgValue()), m_pNonVirtualAlias(this) {}
+
+KvCCfgVariable::~KvCCfgVariable() { delete m_pValue; }
+
+void KvCCfgVariable::setMinValueAndDestroyOld(KvCCfgValue&) {}
+
+void KvCCfgVariable::setMaxValueAndDestroyOld(KvCCfgValue&) {}
+
+KvCCfgValue* KvCCfgVariable::getMinValue() const { return nullptr; }
+
+KvCCfgValue* KvCCfgVariable::getMaxValue() const { return nullptr; }
+
+const KvCCfgValue* KvCCfgVariable::getInitValue() const { return &kUndeterminedInitValue; }
+
+bool KvCCfgVariable::isOutput() const { return false; }
+
+KvCCfgSFVariable* KvCCfgVariable::isSFVariable() { return nullptr; }
+
+KvCSSAVariable* KvCCfgVariable::isSSAVariable() { return nullptr; }
+
+// Array elements and volatile variables may change behind the analysis' back, so nothing about them
+// is constant; the caller sees that through its argument as well.
+void KvCCfgVariable::setVarValueAndAdjustCfgValue(KvCCfgValue& value) {
+  if (isNeverConstant()) {
+    m_pValue = new KvCCfgValue(eCfgNonConstant);
+    value.setValueKind(eCfgNonConstant);
+    return;
+  }
+  fitConstant(value);
+  m_pValue = value.clone();
+}
+
+// A saturated constant keeps the limit exactly: the limit is already a value of the variable, and
+// rounding it could move it past the border again.
+void KvCCfgVariable::fitConstant(KvCCfgValue& value) const {
+  if (!value.isConstant() || ConsiderSaturation(value)) return;
+  if (isScaled())
+    value.changeToRepresentedValue(getScaling());
+  else
+    cast(getDataType(), value, true);
+}
+
+bool KvCCfgVariable::ConsiderSaturation(KvCCfgValue& value) const {
+  bool changed = false;
+  if (isUpperBorderSaturated() && value.getValue() > getUpperLimit()) {
+    value.setValue(getUpperLimit());
+    changed = true;
+  }
+  if (isLowerBorderSaturated() && value.getValue() < getLowerLimit()) {
+    value.setValue(getLowerLimit());
+    changed = true;
+  }
+  return changed;
+}
+
+bool KvCCfgVariable::isScaled() const {
+  const KV_Scaling* pScaling = getScaling();
+  return pScaling && !(pScaling->getLSB() == 1.0 && pScaling->getOffset() == 0.0);
+}
+
+KvCCfgVariable* KvCCfgVariable::topSSAReplacement() const {
+  return m_SSAReplacements.empty() ? nullptr : m_SSAReplacements.top();
+}
+
+void KvCCfgVariable::markAsArray() {
+  m_IsArray = true;
+  dropValueToNonConstant();
+}
+
+void KvCCfgVariable::markAsVolatile() {
+  m_IsVolatile = true;
+  dropValueToNonConstant();
+}
+
+void KvCCfgVariable::dropValueToNonConstant() {
+  delete m_pValue;
+  m_pValue = new KvCCfgValue(eCfgNonConstant);
+}
+
+int KvCCfgVariable::delUse(ssaopt::node v) {
+  KV_CONSISTENCY_CHECK(m_Uses.count(v) != 0, "m_Uses.member(v)", "KvCCfgVariable", kLineDelUse);
+  m_Uses.erase(v);
+  return countUses();
+}
+
+ssaopt::set<ssaopt::node> KvCCfgVariable::getAllUses() const {
+  ssaopt::set<ssaopt::node> uses = m_Uses;
+  for (const KvCCfgVariable* pAlias : m_VirtualAliases) ssaopt::insertAll(uses, pAlias->m_Uses);
+  return uses;
+}
+
+int KvCCfgVariable::countAllUses() const {
+  int count = countUses();
+  for (const KvCCfgVariable* pAlias : m_VirtualAliases) count += pAlias->countUses();
+  return count;
+}
+
+KvCSSAVariable::KvCSSAVariable(KvCCfgVariable* var)
+    : m_pMinValue(new KvCCfgValue()), m_pMaxValue(new KvCCfgValue()) {
+  setOrigVar(var);
+  if (var->isArray()) markAsArray();
+  if (var->isErasable()) markAsErasable();
+  if (var->isVolatile()) markAsVolatile();
+}
+
+KvCSSAVariable::~KvCSSAVariable() {
+  delete m_pMinValue;
+  delete m_pMaxValue;
+}
+
+void KvCSSAVariable::setOrigVar(KvCCfgVariable* var) {
+  KvCSSAVariable* pVersion = var->isSSAVariable();
+  m_pOrigVar = pVersion ? pVersion->getOrigVar() : var;
+}
+
+void KvCSSAVariable::setMinValueAndDestroyOld(KvCCfgValue& value) { replaceBound(m_pMinValue, value); }
+
+void KvCSSAVariable::setMaxValueAndDestroyOld(KvCCfgValue& value) { replaceBound(m_pMaxValue, value); }
+
+void KvCSSAVariable::replaceBound(KvCCfgValue*& pBound, const KvCCfgValue& value) {
+  delete pBound;
+  if (isNeverConstant()) {
+    pBound = new KvCCfgValue(eCfgNonConstant);
+    return;
+  }
+  pBound = value.clone();
+  fitConstant(*pBound);
+}
+
+const KV_DataType* KvCSSAVariable::getDataType() const { return m_pOrigVar->getDataType(); }
+
+const KV_Scaling* KvCSSAVariable::getScaling() const { return m_pOrigVar->getScaling(); }
+
+bool KvCSSAVariable::isUpperBorderSaturated() const { return m_pOrigVar->isUpperBorderSaturated(); }
+
+bool KvCSSAVariable::isLowerBorderSaturated() const { return m_pOrigVar->isLowerBorderSaturated(); }
+
+double KvCSSAVariable::getUpperLimit() const { return m_pOrigVar->getUpperLimit(); }
+
+double KvCSSAVariable::getLowerLimit() const { return m_pOrigVar->getLowerLimit(); }
+
+const KvCCfgValue* KvCSSAVariable::getInitValue() const { return m_pOrigVar->getInitValue(); }
