@@ -20,3 +20,4 @@
 #include "ssaopt/ir/procedure.h"
 #include "ssaopt/ir/statement.h"
 #include "ssaopt/ir/variable.h"
+#include "ssaopt/cfg/control_flow_graph.h"

@@ -1,0 +1,142 @@
+// Building blocks for the control-flow graph tests: a graph that lives in a memory pool, shorthands
+// for blocks and edges, and a check of the graph invariants written independently of the library's
+// own consistency check.
+#pragma once
+
+#include <gtest/gtest.h>
+
+#include <string>
+#include <vector>
+
+#include "ir/doubles.h"
+#include "ssaopt/cfg/control_flow_graph.h"
+#include "ssaopt/frame/graph_algorithms.h"
+#include "ssaopt/frame/pool.h"
+#include "ssaopt/ir/procedure.h"
+
+// The private members that later transformations use, opened to the tests.
+class KvCControlFlowGraphTestAccess {
+public:
+  static void buildFunctionCallGraph(KvCControlFlowGraph& G, ssaopt::graph& fcg,
+                                     ssaopt::map<ssaopt::node, KvCCfgProcedure*>& procedureOf) {
+    G.buildFunctionCallGraph(fcg, procedureOf);
+  }
+  static void setVisited(KvCControlFlowGraph& G, ssaopt::node v) { G.setVisited(v); }
+  static bool isVisited(const KvCControlFlowGraph& G, ssaopt::node v) { return G.isVisited(v); }
+  static void clearAllVisited(KvCControlFlowGraph& G) { G.clearAllVisited(); }
+};
+
+namespace cfgtest {
+
+using ssaopt::edge;
+using ssaopt::node;
+using Nodes = std::vector<node>;
+
+// The graph deletes no payload, statement or expression: everything a test makes comes from a pool
+// that returns it all when the test ends.
+class CfgTest : public ::testing::Test {
+protected:
+  KvCCfgProcedure* procedure(const char* name) {
+    KvCCfgProcedure* pProcedure = nullptr;
+    G.demandProcedureEntryNode(name, pProcedure);
+    return pProcedure;
+  }
+  // A block of `pProcedure` with `statements` test statements and, when `branching`, a condition.
+  node block(KvCCfgProcedure* pProcedure, int statements = 0, bool branching = false) {
+    KvCBasicBlock* pBlock = new KvCBasicBlock();
+    pBlock->setProcedure(pProcedure);
+    for (int i = 0; i < statements; ++i) pBlock->append(new irtest::TestStatement());
+    if (branching) pBlock->appendBranch(new irtest::TestExpression());
+    return G.new_node(pBlock);
+  }
+  // The entry of `pProcedure` leads to `first`.
+  node startWith(KvCCfgProcedure* pProcedure, node first) {
+    plain(pProcedure->getEntryNode(), first);
+    return first;
+  }
+  edge plain(node v, node w) { return G.new_edge(v, w, new KvCCfgEdgeInfo()); }
+  edge onTrue(node v, node w) { return G.new_edge(v, w, new KvCCfgTrueBranch()); }
+  edge onFalse(node v, node w) { return G.new_edge(v, w, new KvCCfgFalseBranch()); }
+
+  KvCBasicBlock& blockOf(node v) { return *G.getBasicBlock(v); }
+  KvCCfgStatement* statement(node v, int i) { return irtest::items(blockOf(v).getStatementSeq()).at(i); }
+  KvCCfgExpression* condition(node v) { return blockOf(v).getBranchCond(); }
+  KvCCfgProcedure* procedureOf(node v) { return G.inf(v)->getProcedure(); }
+  node firstBlock(KvCCfgProcedure* pProcedure) {
+    return G.target(G.first_adj_edge(pProcedure->getEntryNode()));
+  }
+
+  Nodes successors(node v) {
+    Nodes result;
+    for (edge e : G.out(v)) result.push_back(G.target(e));
+    return result;
+  }
+  Nodes predecessors(node v) {
+    Nodes result;
+    for (edge e : G.in(v)) result.push_back(G.source(e));
+    return result;
+  }
+  // The names of the procedures that the block of `v` calls, in statement order.
+  std::vector<std::string> callsIn(node v) {
+    std::vector<std::string> names;
+    for (KvCCfgStatement* pStatement : blockOf(v).getStatementSeq())
+      if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall())
+        names.push_back(pCall->getName().cstring());
+    return names;
+  }
+  std::string procedureNamedAfter(node v) { return "#block_" + std::to_string(blockOf(v).getIndex()); }
+
+  ssaopt::PoolMemController m_Pool;
+  ssaopt::PoolMemController::Scope m_Scope{&m_Pool};
+  KvCControlFlowGraph G;
+};
+
+// Invariants 1 to 6 of a finished graph (every procedure entered at its first block), checked from
+// first principles rather than through checkConsistency.
+inline void expectInvariants(KvCControlFlowGraph& G) {
+  ssaopt::node_array<int> component;
+  int count = ssaopt::COMPONENTS(G, component);
+  ASSERT_EQ(static_cast<std::size_t>(count), G.getProcedures().size()) << "one component per procedure";
+  std::vector<KvCCfgProcedure*> owner(static_cast<std::size_t>(count), nullptr);
+  for (const auto& named : G.getProcedures()) {
+    KvCCfgProcedure* pProcedure = named.second;
+    node entry = pProcedure->getEntryNode();
+    EXPECT_EQ(pProcedure->getName(), named.first);
+    ASSERT_NE(G.inf(entry)->isEntryNode(), nullptr);
+    EXPECT_EQ(owner[component[entry]], nullptr) << "two procedures share a component";
+    owner[component[entry]] = pProcedure;
+    EXPECT_EQ(G.outdeg(entry), 1) << named.first.cstring();
+  }
+  for (node v : G.nodes()) {
+    KvCCfgProcedure* pOwner = owner[component[v]];
+    ASSERT_NE(G.inf(v), nullptr);
+    EXPECT_EQ(G.inf(v)->getProcedure(), pOwner);
+    if (G.indeg(v) == 0) {
+      EXPECT_EQ(v, pOwner->getEntryNode());
+    }
+    KvCBasicBlock* pBlock = G.getBasicBlock(v);
+    int trueEdges = 0, falseEdges = 0;
+    for (edge e : G.out(v)) {
+      trueEdges += G.inf(e)->isTrueBranch() != nullptr;
+      falseEdges += G.inf(e)->isFalseBranch() != nullptr;
+    }
+    bool branching = pBlock && pBlock->getBranchCond();
+    EXPECT_EQ(trueEdges, branching ? 1 : 0);
+    EXPECT_EQ(falseEdges, branching ? 1 : 0);
+    if (branching) {
+      EXPECT_EQ(G.outdeg(v), 2);
+    }
+    if (!pBlock) continue;
+    for (KvCCfgStatement* pStatement : pBlock->getStatementSeq()) {
+      KvCCfgProcedureCall* pCall = pStatement->isProcedureCall();
+      if (!pCall) continue;
+      KvCCfgProcedure* pCallee = G.findProcedure(pCall->getName());
+      ASSERT_NE(pCallee, nullptr) << pCall->getName().cstring();
+      if (pCallee != pOwner) {
+        EXPECT_NE(component[pCallee->getEntryNode()], component[v]);
+      }
+    }
+  }
+}
+
+}  // namespace cfgtest
