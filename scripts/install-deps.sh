@@ -2,7 +2,7 @@
 # Installs the Debian packages the project needs to build and test, when any is missing.
 set -euo pipefail
 
-packages=(g++ cmake ninja-build libgtest-dev libgmock-dev)
+packages=(g++ cmake ninja-build libgtest-dev libgmock-dev graphviz)
 
 missing=()
 for package in "${packages[@]}"; do

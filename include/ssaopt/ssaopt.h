@@ -20,4 +20,5 @@
 #include "ssaopt/ir/procedure.h"
 #include "ssaopt/ir/statement.h"
 #include "ssaopt/ir/variable.h"
+#include "ssaopt/ir/variable_expression.h"
 #include "ssaopt/cfg/control_flow_graph.h"

@@ -98,6 +98,19 @@ node KvCControlFlowGraph::newBlockNode(KvCCfgProcedure* pProcedure) {
 
 edge KvCControlFlowGraph::newPlainEdge(node v, node w) { return new_edge(v, w, new KvCCfgEdgeInfo()); }
 
+void KvCControlFlowGraph::deleteStatement(KvCBasicBlock& block, KvCCfgStatement* pStatement) {
+  m_DeletedStatements.insert(pStatement);
+  block.del(pStatement);
+}
+
+// Nothing is allocated between a deletion and this call, so no address in the set can name a new
+// statement yet.
+void KvCControlFlowGraph::forgetDeletedStatements() {
+  if (m_DeletedStatements.empty()) return;
+  for (const auto& entry : m_Procedures) entry.second->forgetStatements(m_DeletedStatements);
+  m_DeletedStatements.clear();
+}
+
 // ---- The graph object ----------------------------------------------------------------------------
 
 KvCCfgProcedure* KvCControlFlowGraph::findProcedure(const BxCXString& name) const {
@@ -169,6 +182,7 @@ void KvCControlFlowGraph::divideBasicBlock() {
 
 // The chain's first node takes the in-edges in their order, so that phi operands still match them;
 // the last takes the out-edges. The old block object is left alone: its items live on in the chain.
+// The links are recorded, so that dead-code elimination can tell a chain from the next block.
 void KvCControlFlowGraph::replaceByChain(node v, const KvCBasicBlock& block) {
   list<KvCBasicBlock*> links = oneItemBlocks(block);
   if (links.empty()) return;
@@ -177,7 +191,7 @@ void KvCControlFlowGraph::replaceByChain(node v, const KvCBasicBlock& block) {
   for (KvCBasicBlock* pLink : links) {
     node w = new_node(pLink);
     if (last)
-      newPlainEdge(last, w);
+      m_DividedBlockLinks[newPlainEdge(last, w)] = true;
     else
       first = w;
     last = w;

@@ -112,6 +112,12 @@ ssaopt::set<KvCCfgVariable*> KvCCfgParamStatement::getUsedVariables() const {
   return used;
 }
 
+bool KvCCfgParamStatement::hasSideEffects() const {
+  for (const auto& entry : m_Arguments)
+    if (entry.second && entry.second->hasSideEffects()) return true;
+  return false;
+}
+
 KvCCfgExpression* KvCCfgParamStatement::getArgument(KvCCfgProcedureCall* pCall) const {
   KvCCfgExpression* const* ppArgument = m_Arguments.lookup(pCall);
   return ppArgument ? *ppArgument : nullptr;

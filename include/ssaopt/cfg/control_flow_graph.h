@@ -90,6 +90,74 @@ public:
 
   // ---- SSA construction and the optimisations join here, each in a source file of its own ------
 
+  // ---- SSA construction: dominators (dominators.cpp) -------------------------------------------
+
+  // Sets the immediate dominator of every node: nil for the node without in-edges that roots each
+  // component, and for every node that such a root does not reach.
+  void computeAllIdoms();
+  // Fills the dominance frontier of every node; needs computeAllIdoms and the trees built after it.
+  void computeDominanceFrontiers(ssaopt::array<KvCDominatorTree*>& trees);
+
+  // ---- SSA construction: phi placement and the SSA driver (ssa.cpp) ----------------------------
+
+  // Puts the whole program, all procedures at once, into SSA form: interface statements between the
+  // procedures, phi functions, and one new version per definition. A graph is transformed once.
+  void transformToSSAForm();
+  // Places phi functions at the iterated dominance frontier of every assigned variable; needs the
+  // frontiers. An exit node that needs one becomes a block followed by a new exit node.
+  void placePhiFunction();
+
+  // ---- Sparse conditional constant propagation (constant_propagation.cpp) ----------------------
+
+  // Adds the SSA def-use edges, then propagates lattice values, value ranges and executable edges
+  // over every procedure in passes; with `removeDeadCode`, removes after each pass what it did not
+  // reach. The SSA edges stay until hoisting deletes them. Needs SSA form and divided blocks.
+  void propagateSparseConditionalConstant(bool removeDeadCode);
+  // Rebuilds the use sets and adds one SSA edge per defining node, defined variable and using node,
+  // beside any SSA edges already there.
+  void addSSAEdges();
+  // The propagation alone, over the SSA edges present and the use sets as they are. Afterwards the
+  // executable flags are those of the procedure processed last (in name order), while the visited
+  // marks gather what the last pass reached in every procedure.
+  void sparseConditionalConstant(bool removeDeadCode);
+
+  // ---- Constant substitution, folding and unused definitions (substitution.cpp) ---------------
+
+  // Lets the right-hand side of every assignment, and every branch condition, put constants in
+  // place of the variables that propagation found constant.
+  void replaceConstantVariables();
+  // Lets every branch condition replace itself by its constant outcome where it has one.
+  void replaceConstantConditions();
+  // Lets every assignment and branch condition fold its constant parts.
+  void foldConstants();
+  // Deletes, until none is left, the phi functions and statements of divided blocks that define an
+  // erasable, non-array variable that nothing reads, when they have no side effects.
+  void removeUnusedVarDefs();
+
+  // ---- Procedure inlining (inlining.cpp) -------------------------------------------------------
+
+  // Registers every call of the graph in its procedure's call list, then puts the body of each
+  // procedure called from exactly one place (never "#main", never from inside itself) in place of its
+  // call, its parameters becoming initialisation assignments in a new block before the body; the
+  // procedure leaves the table. Expects exit nodes placed and each call alone in a block with one
+  // successor; a call that is not is reported (while internal information is on) and stays.
+  void inlineProcedures();
+
+  // ---- Valid-condition assignments (valid_conditions.cpp) --------------------------------------
+
+  // On the branch edges of every block whose condition tests a variable, places a new block holding
+  // a virtual assignment of the value that the variable has on that branch. A logical variable
+  // compared with a constant other than 0 and 1 gets no assignment: its condition is told so and
+  // becomes the constant outcome. Runs before transformToSSAForm.
+  void insertValidConditionAssignments();
+
+  // ---- Code hoisting (hoisting.cpp) ------------------------------------------------------------
+
+  // Deletes the SSA edges, then at every branch offers the statement classes the statements at the
+  // heads of both branches, pair after pair, to move one of each matching pair before the branch and
+  // drop the other.
+  void hoistCodeOutOfIfElseBranches();
+
 private:
   friend class KvCControlFlowGraphTestAccess;
 
@@ -107,6 +175,12 @@ private:
   ssaopt::node firstBlockOf(const KvCCfgProcedure& procedure) const;
   ssaopt::node newBlockNode(KvCCfgProcedure* pProcedure);
   ssaopt::edge newPlainEdge(ssaopt::node v, ssaopt::node w);
+  // Deletes a statement of `block` and remembers it, so that forgetDeletedStatements can take it
+  // out of the procedure records, which list calls, parameter and value-return statements.
+  void deleteStatement(KvCBasicBlock& block, KvCCfgStatement* pStatement);
+  // Takes every statement deleted since the last call out of every procedure record, so that no
+  // record points to freed memory.
+  void forgetDeletedStatements();
 
   // ---- Block surgery (graph.cpp) ---------------------------------------------------------------
 
@@ -143,6 +217,104 @@ private:
   void addCallEdges(const KvCBasicBlock& block, ssaopt::graph& fcg,
                     ssaopt::map<ssaopt::node, KvCCfgProcedure*>& procedureOf) const;
 
+  // ---- SSA construction: dominators (dominators.cpp) -------------------------------------------
+
+  friend class KvCControlFlowGraphSSATestAccess;
+  class LengauerTarjan;
+
+  // Immediate dominators of one component, given as its nodes in node order.
+  void computeIdomsFast(const ssaopt::array<ssaopt::node>& nodes, LengauerTarjan& dominators,
+                        ssaopt::node_array<ssaopt::node>& idom);
+  // One tree per component, in component numbering, rooted at the component's entry node; returns
+  // the number of trees. freeDominatorTrees deletes them again.
+  int buildDominatorTrees(ssaopt::array<KvCDominatorTree*>& trees);
+  void freeDominatorTrees(ssaopt::array<KvCDominatorTree*>& trees, int count);
+  void fillFrontier(const KvCDominatorTree& tree, ssaopt::node t);
+  ssaopt::node idomOf(ssaopt::node v) const;
+
+  // ---- SSA construction: def/use summaries and interface statements (summaries.cpp) ------------
+
+  // What every procedure, with all that it calls, defines and uses.
+  void collectVarDefsAndUses();
+  void addVarDefsAndUsesOfCalledProcs();
+  void deleteVarDefsAndUsesStoredAtProcedures();
+  // A block after every entry node: initial values in the start procedure, parameters elsewhere.
+  void initVariablesAfterEntryNodes();
+  void addVarInits(ssaopt::node v, ssaopt::set<KvCCfgVariable*> variables);
+  void addParamStatements(ssaopt::node v, ssaopt::set<KvCCfgVariable*> variables,
+                          KvCCfgProcedure* pProcedure);
+  // After every call, what the callee defines comes back.
+  void placeValueReturnStatements();
+  void addValueReturnStatements(KvCBasicBlock* pBlock, ssaopt::set<KvCCfgVariable*> variables,
+                                KvCCfgProcedure* pProcedure);
+  // Before the exit of "#main", every output variable is read.
+  void placeOutputStatements();
+
+  void addDefsAndUsesOfBlock(const KvCBasicBlock& block, KvCCfgProcedure& procedure) const;
+  void addArgumentUses(KvCCfgProcedure& caller, KvCCfgProcedureCall* pCall) const;
+  static void addUses(KvCCfgProcedure& procedure, const ssaopt::set<KvCCfgVariable*>& variables);
+  void addFormalsToDefinedVariables();
+  static void passFormalWhereArgumentMissing(KvCCfgParamStatement& param,
+                                             const ssaopt::list<KvCCfgProcedureCall*>& calls);
+  ssaopt::node placeValueReturnStatementsAfterCalls(ssaopt::node v);
+
+  // ---- SSA construction: phi placement and renaming (ssa.cpp) ----------------------------------
+
+  // Variable -> the nodes that define it, in node order, a node once per definition.
+  using DefinitionSites = ssaopt::map<KvCCfgVariable*, ssaopt::array<ssaopt::node>>;
+  class SSARenamer;
+
+  // Fills `sites` and returns the assigned variables in order of first definition.
+  ssaopt::list<KvCCfgVariable*> getDefinedVariables(DefinitionSites& sites);
+  KvCBasicBlock* blockForPhiFunctions(ssaopt::node y);
+  KvCBasicBlock* turnExitIntoBlock(ssaopt::node y);
+  void renameVariables(ssaopt::array<KvCDominatorTree*>& trees);
+
+  // ---- Procedure inlining (inlining.cpp) -------------------------------------------------------
+
+  using ProcedureSet = ssaopt::set<const KvCCfgProcedure*>;
+
+  // What one run of inlineProcedures knows: the procedures called from one place, and which
+  // procedure each inlined one went into.
+  struct InliningRun {
+    ProcedureSet calledOnce;
+    ssaopt::map<const KvCCfgProcedure*, KvCCfgProcedure*> inlinedInto;
+
+    KvCCfgProcedure* procedureNow(KvCCfgProcedure* pProcedure);
+  };
+
+  // Appends every call in the blocks of `nodes` to its procedure's call list; returns the nodes
+  // whose blocks hold a call, in the order of `nodes`.
+  ssaopt::list<ssaopt::node> registerCalls(const ssaopt::list<ssaopt::node>& nodes);
+  ProcedureSet proceduresCalledOnce() const;
+  // Inlines the call that the block of `v` holds when its procedure is called once; true when it
+  // did, and `v` is gone then.
+  bool inlineProcedureCalls(ssaopt::node v, KvCBasicBlock* pBasicBlock, InliningRun& run);
+  bool canTakeBodyOf(ssaopt::node v, const KvCCfgProcedure& callee) const;
+  void settleProcedures(InliningRun& run);
+  ssaopt::node newParameterBlock(KvCCfgProcedure* pCaller, const KvCCfgProcedure& callee,
+                                 KvCCfgProcedureCall* pCall);
+  void spliceBody(ssaopt::node v, ssaopt::node parameters, KvCCfgProcedure* pCallee);
+
+  // ---- Valid-condition assignments (valid_conditions.cpp) --------------------------------------
+
+  // Makes the assignments that the condition implies on its true and on its false branch (each
+  // null when there is none; the caller owns them), or lets the condition become constant.
+  void createValidConditionAssignments(KvCCfgExpression*& pCond, KvCCfgAssignment*& trueAssign,
+                                       KvCCfgAssignment*& falseAssign);
+  void placeOnBranch(ssaopt::edge e, KvCCfgAssignment* pAssign);
+
+  // ---- Code hoisting (hoisting.cpp) ------------------------------------------------------------
+
+  void performCodeHoisting(ssaopt::node v);
+  // The next statement that the walk down a branch from `e` offers for hoisting, with `e` moved on
+  // past its block; null where the walk has to stop.
+  KvCCfgStatement* nextHoistingCandidate(ssaopt::edge& e, bool skipNext) const;
+  // Whether `s` may move before a branch on `cond`: it must not define what the condition reads.
+  bool checkForHoisting(KvCCfgStatement* s, KvCCfgExpression* cond) const;
+  ssaopt::set<KvCCfgVariable*> variablesDefinedBy(KvCCfgStatement* s) const;
+  void deleteSSAEdges();
+
   ssaopt::node m_StartNode;
   ProcedureTable m_Procedures;
   // Absent entries read as false.
@@ -150,4 +322,82 @@ private:
   // Reached-marks for the walks of makeProcedureAndCall: all false between walks, so that a walk
   // costs the size of what it reaches, not of the whole graph.
   ssaopt::node_array<bool> m_Reached;
+  // Statements deleted since the procedure records last forgot them (compared, never read).
+  ssaopt::set<const KvCCfgStatement*> m_DeletedStatements;
+
+  // ---- Sparse conditional constant propagation (constant_propagation.cpp) ----------------------
+
+  void buildVarUses();
+  void propagateFrom(ssaopt::node entry, ssaopt::list<ssaopt::edge>& cfgWorkList,
+                     ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
+  void initSparseConditionalConstant(ssaopt::node entry, ssaopt::list<ssaopt::edge>& cfgWorkList,
+                                     ssaopt::list<ssaopt::edge>& ssaWorkList);
+  void flowStep(ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
+                bool& changed);
+  void ssaStep(ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
+               bool& changed);
+  void visitInstruction(KvCBasicBlock* pBasicBlock, ssaopt::node v, ssaopt::list<ssaopt::edge>& cfgWorkList,
+                        ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
+  void visitAssignment(KvCCfgAssignment* pAssignment, ssaopt::node v, ssaopt::list<ssaopt::edge>& cfgWorkList,
+                       ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
+  void visitBranchCondition(KvCCfgExpression* pCond, ssaopt::node v, ssaopt::list<ssaopt::edge>& cfgWorkList);
+  void visitParamStatement(KvCCfgParamStatement* pStatement, ssaopt::node v,
+                           ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
+                           bool& changed);
+  void visitValueReturnStatement(KvCCfgValueReturnStatement* pStatement, ssaopt::node v,
+                                 ssaopt::list<ssaopt::edge>& cfgWorkList,
+                                 ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
+  // The visit shared by assignments, parameter and value-return statements: `definition` gives the
+  // new value, minimum and maximum of `pVariable`.
+  template <class Definition>
+  void visitDefinition(KvCCfgVariable* pVariable, const Definition& definition, ssaopt::node v,
+                       ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
+                       bool& changed);
+  template <class Definition>
+  void recordRange(KvCCfgVariable* pVariable, const Definition& definition);
+  void visitPhiFunction(KvCPhiFunction* pPhi, ssaopt::node v, bool& changed);
+
+  int countExecutableInEdges(ssaopt::node v) const;
+  int countCfgOutEdges(ssaopt::node v) const;
+  void appendCfgOutEdges(ssaopt::node v, ssaopt::list<ssaopt::edge>& workList) const;
+  void appendSSAOutEdges(ssaopt::node v, ssaopt::list<ssaopt::edge>& workList) const;
+  // The control-flow out-edges of `v`, in adjacency order; nil after the last.
+  ssaopt::edge firstCfgOutEdge(ssaopt::node v) const;
+  ssaopt::edge nextCfgOutEdge(ssaopt::edge e) const;
+  ssaopt::edge controlFlowOrNil(ssaopt::edge e) const;
+
+  void activateEdge(ssaopt::edge e);
+  void deactivateExecutableEdges();
+  void deactivateAllEdges();
+
+  // The edges whose executable flag the current pass set since the last clearing, so that the next
+  // procedure clears only those instead of every edge of the graph. Empty outside propagation.
+  ssaopt::list<ssaopt::edge> m_ExecutableEdges;
+  // Per node, how many in-edges carry the executable flag. The flow step asks at every edge that
+  // becomes executable; counting at a join with many in-edges each time would be quadratic.
+  ssaopt::node_array<int> m_ExecutableInEdges;
+
+  // ---- Dead-code elimination (dead_code.cpp) ---------------------------------------------------
+
+  // Deletes the blocks that the last pass did not reach with their phi operands elsewhere; true when
+  // a phi operand was removed.
+  bool eliminateDeadCode();
+  bool isDeadBlock(ssaopt::node v) const;
+  // A reached phi node that a control-flow edge of `v` leads to, or nil.
+  ssaopt::node reachedPhiSuccessor(ssaopt::node v) const;
+  KvCPhiFunction* phiFunctionAt(ssaopt::node v) const;
+  void removeDeadOperands(ssaopt::node t);
+  ssaopt::array<int> removeDeadInEdges(ssaopt::node t);
+  ssaopt::node nextPhiChainLink(ssaopt::node link) const;
+  void removeOperands(ssaopt::node link, KvCPhiFunction& phi, const ssaopt::array<int>& positions);
+  void destroyDeadBlock(ssaopt::node n);
+  bool isDividedBlockLink(ssaopt::edge e) const;
+
+  // The edges that divideBasicBlock made between the pieces of one block. The operand removal walks
+  // a chain of phi nodes along these only, never on into the next block.
+  ssaopt::edge_array<bool> m_DividedBlockLinks;
+
+  // ---- Constant substitution, folding and unused definitions (substitution.cpp) ---------------
+
+  void removeDefinitionIfUnused(ssaopt::node v, bool& again);
 };

@@ -43,6 +43,11 @@ public:
   void appendUsedVariable(KvCCfgVariable* v) { m_UsedVariables.insert(v); }
   // Empties the summary only; calls and interface statements stay.
   void deleteInfoAboutVarDefAndUses();
+
+  // Drops every call, parameter statement and value-return statement named in `gone` (statements
+  // that a transformation deleted), and the arguments that the remaining parameter statements hold
+  // for calls that are gone. The pointers in `gone` are only compared, never read.
+  void forgetStatements(const ssaopt::set<const KvCCfgStatement*>& gone);
   // One per formal parameter, in parameter order.
   ssaopt::list<KvCCfgParamStatement*> getParamStatements() const { return m_ParamStatements; }
   void appendParamStatement(KvCCfgParamStatement* pStatement) { m_ParamStatements.push_back(pStatement); }

@@ -174,11 +174,16 @@ public:
   ssaopt::set<KvCCfgVariable*> getDefinedVariables() const override { return {m_pVariable}; }
   // What all arguments read.
   ssaopt::set<KvCCfgVariable*> getUsedVariables() const override;
+  // A call evaluates the arguments it passes: when one has side effects (reads a volatile input), so
+  // has the statement, which must then stay even when nothing reads the formal.
+  bool hasSideEffects() const override;
 
   KvCCfgVariable* getVariable() const { return m_pVariable; }
   void setVariable(KvCCfgVariable* pVariable) { m_pVariable = pVariable; }
   // A later argument for the same call replaces the earlier one.
   void setArgument(KvCCfgProcedureCall* pCall, KvCCfgExpression* pArg) { m_Arguments[pCall] = pArg; }
+  // Forgets the argument of a call that no longer exists; the key is only compared, never read.
+  void removeArgument(KvCCfgProcedureCall* pCall) { m_Arguments.undefine(pCall); }
   // The argument that `pCall` passes, or null when it passes none; adds no entry.
   KvCCfgExpression* getArgument(KvCCfgProcedureCall* pCall) const;
   // Every argument in the order the calls were first given one. Entries may hold null.

@@ -1,0 +1,46 @@
+// The front end of the textual format: reads a program, checks it and builds its control-flow graph
+// through the library's public building operations only, in the order a code generator would:
+//
+//   1. one demandProcedureEntryNode per procedure, "#main" among them;
+//   2. the blocks of each procedure with their statements, plain edges, and true and false edges out
+//      of blocks with a condition; splitAtStatement and splitAtCondition leave every call alone in a
+//      block of its own with a single successor;
+//   3. setParametersOfCall for every call of a procedure with formal parameters;
+//   4. makeProcedureAndCall on every block written "outline L:" (the extra call it returns is
+//      deleted: the calls it places are the real ones, split off into blocks of their own);
+//   5. placeExitNodes, placeLoopAroundMain, and the start node at the entry of "#main".
+//
+// Calls are not registered in their procedures' call lists here: Program::completeCallLists does that
+// before the SSA transformation, unless inlining already did.
+//
+// The graph it hands over keeps the invariants the library relies on: blocks that cannot be reached
+// from their procedure's entry are dropped (with a warning naming them), every procedure reaches its
+// end, no argument of a call reads a formal parameter of the called procedure other than its own, no
+// variable is both volatile and erasable, and every variable an external call may modify is volatile
+// or an array (the library treats external calls as defining nothing).
+//
+// The program is made while a memory controller is installed, and must be destroyed while the same
+// one still is (see program.h).
+#pragma once
+
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "ssaopt/client/diagnostics.h"
+#include "ssaopt/client/program.h"
+
+namespace ssaopt::client {
+
+struct LoadResult {
+  std::unique_ptr<Program> program;  // null after an error
+  // The warnings, and the error that stopped the front end, in the order found.
+  std::vector<Diagnostic> diagnostics;
+};
+
+LoadResult loadProgram(std::string text);
+
+// Reads the file first; an unreadable file is an error at line 0.
+LoadResult loadProgramFile(const std::string& path);
+
+}  // namespace ssaopt::client

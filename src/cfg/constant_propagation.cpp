@@ -1,0 +1,323 @@
+// Sparse conditional constant propagation with value ranges (Wegman and Zadeck's algorithm over the
+// three-level lattice): values flow along SSA def-use edges, and only along control-flow edges that
+// the constants found so far leave executable.
+//
+//   before:  c.1 = 1; if (c.1) { x.1 = 2; } else { x.2 = 3; }  x.3 = phi(x.1, x.2); y.1 = x.3 + 1
+//   after:   c.1 = 1, x.1 = 2 in [2, 2], x.3 = 2, y.1 = 3; x.2 is never reached and stays
+//            undetermined, which leaves the meet at x.3 alone; only the true edge is executable.
+//            With removeDeadCode the else block and the x.2 operand go, and x.3 gets [2, 2].
+//
+// Needs SSA form and divided blocks (one phi function, one statement or the condition alone).
+#include <algorithm>
+#include <functional>
+
+#include "ssaopt/cfg/control_flow_graph.h"
+#include "ssaopt/ir/expression.h"
+#include "ssaopt/ir/procedure.h"
+#include "ssaopt/ir/statement.h"
+#include "ssaopt/ir/variable.h"
+#include "ssaopt/values/arithmetic.h"
+
+using ssaopt::edge;
+using ssaopt::list;
+using ssaopt::node;
+
+namespace {
+
+edge popFront(list<edge>& workList) {
+  edge e = workList.front();
+  workList.pop_front();
+  return e;
+}
+
+// A range bound of an operand. Only SSA versions keep a range; any other variable's bounds are its
+// value, which is as much as anybody knows of it.
+KvCCfgValue* boundOf(KvCCfgValue* pBound, const KvCCfgVariable& variable) {
+  return pBound ? pBound : variable.getValue();
+}
+
+// The operands of `phi` once each, in ascending order: what its getUsedVariables() gives, without
+// building a set. The bounds merge takes the first operand without a known bound, so the order
+// matters.
+ssaopt::array<KvCCfgVariable*> distinctOperands(const KvCPhiFunction& phi) {
+  ssaopt::array<KvCCfgVariable*> operands = phi.getReplacementVariables();
+  operands.erase(std::remove(operands.begin(), operands.end(), nullptr), operands.end());
+  std::sort(operands.begin(), operands.end(), std::less<KvCCfgVariable*>());
+  operands.erase(std::unique(operands.begin(), operands.end()), operands.end());
+  return operands;
+}
+
+// Overwrites the elements of `values`, one per operand, with what `of` gives for each operand.
+template <class Of>
+void fillWith(list<KvCCfgValue*>& values, const ssaopt::array<KvCCfgVariable*>& operands, Of of) {
+  auto slot = values.begin();
+  for (KvCCfgVariable* pOperand : operands) *slot++ = of(pOperand);
+}
+
+// The cast to the variable's type wraps a bound that leaves the type's range (an int8 in [0, 100]
+// plus 100 gives [100, -56]); a wrapped range claims too little, so the variable gets no range.
+void dropInvertedRange(KvCCfgVariable& variable) {
+  const KvCCfgValue* pMin = variable.getMinValue();
+  const KvCCfgValue* pMax = variable.getMaxValue();
+  if (!pMin || !pMax || !pMin->isConstant() || !pMax->isConstant()) return;
+  if (pMin->getValue() <= pMax->getValue()) return;
+  KvCCfgValue unknown(eCfgNonConstant);
+  variable.setMinValueAndDestroyOld(unknown);
+  variable.setMaxValueAndDestroyOld(unknown);
+}
+
+}  // namespace
+
+void KvCControlFlowGraph::propagateSparseConditionalConstant(bool removeDeadCode) {
+  addSSAEdges();
+  sparseConditionalConstant(removeDeadCode);
+}
+
+// Adding edges leaves the node list alone, so the live view serves.
+void KvCControlFlowGraph::addSSAEdges() {
+  buildVarUses();
+  for (node v : nodes()) {
+    KvCCfgNodeInfo* pInf = inf(v);
+    if (!pInf) continue;
+    for (KvCCfgVariable* pVariable : pInf->getAssignedVariables())
+      for (node user : pVariable->getUses()) new_edge(v, user, new KvCSSAEdge());
+  }
+}
+
+// Only assigned variables are cleared: a variable that nothing assigns keeps the uses it had.
+void KvCControlFlowGraph::buildVarUses() {
+  for (node v : nodes())
+    if (KvCCfgNodeInfo* pInf = inf(v))
+      for (KvCCfgVariable* pVariable : pInf->getAssignedVariables()) pVariable->clearUses();
+  for (node v : nodes())
+    if (KvCCfgNodeInfo* pInf = inf(v))
+      for (KvCCfgVariable* pVariable : pInf->getUsedVariables()) pVariable->appendUse(v);
+}
+
+// Passes repeat while a pass made a variable constant or dead-code removal took a phi operand away,
+// for either can make a condition constant that was not before. The procedures are taken in the
+// table's order, ascending by name.
+void KvCControlFlowGraph::sparseConditionalConstant(bool removeDeadCode) {
+  list<edge> cfgWorkList;
+  list<edge> ssaWorkList;
+  bool repeat = true;
+  while (repeat) {
+    bool changed = false;
+    clearAllVisited();
+    // What the first procedure's start would do; the later ones then clear only what their
+    // predecessors set.
+    if (!m_Procedures.empty()) deactivateAllEdges();
+    for (const auto& named : m_Procedures)
+      propagateFrom(named.second->getEntryNode(), cfgWorkList, ssaWorkList, changed);
+    bool deleted = removeDeadCode && eliminateDeadCode();
+    repeat = changed || deleted;
+  }
+  // The flags stay as the last procedure left them; the record of them must not outlive the edges.
+  m_ExecutableEdges.clear();
+}
+
+// The two lists are served in turn, one edge each, until both are empty.
+void KvCControlFlowGraph::propagateFrom(node entry, list<edge>& cfgWorkList, list<edge>& ssaWorkList,
+                                        bool& changed) {
+  initSparseConditionalConstant(entry, cfgWorkList, ssaWorkList);
+  while (!cfgWorkList.empty() || !ssaWorkList.empty()) {
+    if (!cfgWorkList.empty()) flowStep(cfgWorkList, ssaWorkList, changed);
+    if (!ssaWorkList.empty()) ssaStep(cfgWorkList, ssaWorkList, changed);
+  }
+}
+
+// Every procedure starts from no executable edge at all, so the flags left after a pass are those of
+// the procedure processed last. The pass cleared every flag before the first procedure; each later
+// one clears the flags its predecessors set, which is the same and costs what they reached.
+void KvCControlFlowGraph::initSparseConditionalConstant(node entry, list<edge>& cfgWorkList,
+                                                        list<edge>& ssaWorkList) {
+  cfgWorkList.clear();
+  ssaWorkList.clear();
+  for (edge e : out(entry)) cfgWorkList.push_back(e);
+  deactivateExecutableEdges();
+}
+
+void KvCControlFlowGraph::deactivateAllEdges() {
+  for (edge e : edges()) inf(e)->deactivateEdgeExecutable();
+  m_ExecutableEdges.clear();
+  m_ExecutableInEdges.fill(0);
+}
+
+void KvCControlFlowGraph::deactivateExecutableEdges() {
+  for (edge e : m_ExecutableEdges) {
+    inf(e)->deactivateEdgeExecutable();
+    --m_ExecutableInEdges[target(e)];
+  }
+  m_ExecutableEdges.clear();
+}
+
+void KvCControlFlowGraph::activateEdge(edge e) {
+  inf(e)->activateEdgeExecutable();
+  m_ExecutableEdges.push_back(e);
+  ++m_ExecutableInEdges[target(e)];
+}
+
+// A phi node is visited on every edge into it that becomes executable; any other node only on the
+// first, later ones reach it through its SSA in-edges.
+void KvCControlFlowGraph::flowStep(list<edge>& cfgWorkList, list<edge>& ssaWorkList, bool& changed) {
+  edge e = popFront(cfgWorkList);
+  if (inf(e)->isEdgeExecutable()) return;
+  activateEdge(e);
+  node v = target(e);
+  if (KvCBasicBlock* pBlock = getBasicBlock(v)) {
+    setVisited(v);
+    if (KvCPhiFunction* pPhi = pBlock->isPhiFunction())
+      visitPhiFunction(pPhi, v, changed);
+    else if (countExecutableInEdges(v) == 1)
+      visitInstruction(pBlock, v, cfgWorkList, ssaWorkList, changed);
+  }
+  // A branch schedules its edges itself, when its condition is visited.
+  if (countCfgOutEdges(v) == 1) appendCfgOutEdges(v, cfgWorkList);
+}
+
+// Sets no executable flag: a use is revisited only where control already reaches it, phi functions
+// excepted, which always merge all their operands.
+void KvCControlFlowGraph::ssaStep(list<edge>& cfgWorkList, list<edge>& ssaWorkList, bool& changed) {
+  node v = target(popFront(ssaWorkList));
+  KvCBasicBlock* pBlock = getBasicBlock(v);
+  if (!pBlock) return;
+  if (KvCPhiFunction* pPhi = pBlock->isPhiFunction())
+    visitPhiFunction(pPhi, v, changed);
+  else if (countExecutableInEdges(v) >= 1)
+    visitInstruction(pBlock, v, cfgWorkList, ssaWorkList, changed);
+}
+
+void KvCControlFlowGraph::visitInstruction(KvCBasicBlock* pBasicBlock, node v, list<edge>& cfgWorkList,
+                                           list<edge>& ssaWorkList, bool& changed) {
+  KvCCfgExpression* pCond = pBasicBlock->getBranchCond();
+  KvCCfgStatement* pStatement = pBasicBlock->isStatement();
+  KvCCfgAssignment* pAssignment = pStatement ? pStatement->isAssignment() : nullptr;
+  KvCCfgParamStatement* pParam = pStatement ? pStatement->isParamStatement() : nullptr;
+  KvCCfgValueReturnStatement* pReturn = pStatement ? pStatement->isValueReturnStatement() : nullptr;
+  if (pAssignment)
+    visitAssignment(pAssignment, v, cfgWorkList, ssaWorkList, changed);
+  else if (pCond)
+    visitBranchCondition(pCond, v, cfgWorkList);
+  else if (pParam)
+    visitParamStatement(pParam, v, cfgWorkList, ssaWorkList, changed);
+  else if (pReturn)
+    visitValueReturnStatement(pReturn, v, cfgWorkList, ssaWorkList, changed);
+  else
+    appendCfgOutEdges(v, cfgWorkList);
+}
+
+void KvCControlFlowGraph::visitAssignment(KvCCfgAssignment* pAssignment, node v, list<edge>& cfgWorkList,
+                                          list<edge>& ssaWorkList, bool& changed) {
+  visitDefinition(pAssignment->getLHS(), *pAssignment->getRHS(), v, cfgWorkList, ssaWorkList, changed);
+}
+
+// The statement combines the arguments of all calls of its procedure.
+void KvCControlFlowGraph::visitParamStatement(KvCCfgParamStatement* pStatement, node v,
+                                              list<edge>& cfgWorkList, list<edge>& ssaWorkList,
+                                              bool& changed) {
+  visitDefinition(pStatement->getVariable(), *pStatement, v, cfgWorkList, ssaWorkList, changed);
+}
+
+void KvCControlFlowGraph::visitValueReturnStatement(KvCCfgValueReturnStatement* pStatement, node v,
+                                                    list<edge>& cfgWorkList, list<edge>& ssaWorkList,
+                                                    bool& changed) {
+  visitDefinition(pStatement->getVariable(), *pStatement->getExpression(), v, cfgWorkList, ssaWorkList,
+                  changed);
+}
+
+// The variable's previous value object is the caller's once the new one is stored: it is compared
+// with the new value and then freed. Only a value going from undetermined to constant asks for
+// another pass; any change wakes the uses.
+template <class Definition>
+void KvCControlFlowGraph::visitDefinition(KvCCfgVariable* pVariable, const Definition& definition, node v,
+                                          list<edge>& cfgWorkList, list<edge>& ssaWorkList, bool& changed) {
+  KvCCfgValue* pOld = pVariable->getValue();
+  KvCCfgValue value = definition.evaluate();
+  pVariable->setVarValueAndAdjustCfgValue(value);
+  recordRange(pVariable, definition);
+  if (pOld->compare(value) != 0) {
+    if (pOld->isUndetermined() && value.isConstant()) changed = true;
+    appendSSAOutEdges(v, ssaWorkList);
+  }
+  if (!value.isNonConstant()) appendCfgOutEdges(v, cfgWorkList);
+  delete pOld;
+}
+
+// The minimum is stored before the maximum is computed: a definition that reads its own variable
+// (a recursive call passing a parameter on) sees the new value in both bounds.
+template <class Definition>
+void KvCControlFlowGraph::recordRange(KvCCfgVariable* pVariable, const Definition& definition) {
+  KvCCfgValue minimum = definition.getMinimum();
+  pVariable->setMinValueAndDestroyOld(minimum);
+  KvCCfgValue maximum = definition.getMaximum();
+  pVariable->setMaxValueAndDestroyOld(maximum);
+  dropInvertedRange(*pVariable);
+}
+
+// A constant comparing equal to 0.0 takes the false edge, every other constant the true edge;
+// undetermined and non-constant conditions open both.
+void KvCControlFlowGraph::visitBranchCondition(KvCCfgExpression* pCond, node v, list<edge>& cfgWorkList) {
+  KvCCfgValue condition = pCond->evaluate();
+  if (!condition.isConstant()) {
+    appendCfgOutEdges(v, cfgWorkList);
+    return;
+  }
+  bool taken = condition.getValue() != 0.0;
+  for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) {
+    KvCCfgEdgeInfo* pInf = inf(e);
+    if (taken ? pInf->isTrueBranch() != nullptr : pInf->isFalseBranch() != nullptr) cfgWorkList.push_back(e);
+  }
+}
+
+// All operands take part, whether the edge they come by is executable or not: an operand that is
+// still undetermined leaves the meet alone. Nothing is scheduled: the uses are reached by the flow
+// step or in the next pass. Unlike an assignment, any change to a constant asks for another pass.
+// A join of thousands of edges is merged again on every one of them that becomes executable, so the
+// merge reuses one list for the values and the two bounds.
+void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node /*v*/, bool& changed) {
+  KvCCfgVariable* pVariable = pPhi->getVariable();
+  KvCCfgValue* pOld = pVariable->getValue();
+  ssaopt::array<KvCCfgVariable*> operands = distinctOperands(*pPhi);
+  list<KvCCfgValue*> merged(operands.size());
+  fillWith(merged, operands, [](KvCCfgVariable* pOperand) { return pOperand->getValue(); });
+  KvCCfgValue value = intersect(merged);
+  pVariable->setVarValueAndAdjustCfgValue(value);
+  if (!pOld->isConstant() && value.isConstant()) changed = true;
+  fillWith(merged, operands,
+           [](KvCCfgVariable* pOperand) { return boundOf(pOperand->getMinValue(), *pOperand); });
+  KvCCfgValue minimum = determineMinimum(merged);
+  pVariable->setMinValueAndDestroyOld(minimum);
+  fillWith(merged, operands,
+           [](KvCCfgVariable* pOperand) { return boundOf(pOperand->getMaxValue(), *pOperand); });
+  KvCCfgValue maximum = determineMaximum(merged);
+  pVariable->setMaxValueAndDestroyOld(maximum);
+  delete pOld;
+}
+
+int KvCControlFlowGraph::countExecutableInEdges(node v) const { return m_ExecutableInEdges[v]; }
+
+int KvCControlFlowGraph::countCfgOutEdges(node v) const {
+  int count = 0;
+  for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) ++count;
+  return count;
+}
+
+void KvCControlFlowGraph::appendCfgOutEdges(node v, list<edge>& workList) const {
+  for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) workList.push_back(e);
+}
+
+void KvCControlFlowGraph::appendSSAOutEdges(node v, list<edge>& workList) const {
+  for (edge e : out(v))
+    if (inf(e)->isSSAEdge()) workList.push_back(e);
+}
+
+// addSSAEdges adds a node's SSA out-edges after its control-flow out-edges, so the control-flow
+// edges end at the first SSA edge: a definition with thousands of uses costs a flow step no more
+// than a jump does.
+edge KvCControlFlowGraph::firstCfgOutEdge(node v) const { return controlFlowOrNil(first_adj_edge(v)); }
+
+edge KvCControlFlowGraph::nextCfgOutEdge(edge e) const { return controlFlowOrNil(adj_succ(e)); }
+
+edge KvCControlFlowGraph::controlFlowOrNil(edge e) const {
+  return e && !inf(e)->isSSAEdge() ? e : edge(ssaopt::nil);
+}

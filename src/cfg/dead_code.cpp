@@ -1,0 +1,123 @@
+// Dead-code elimination between the passes of sparse conditional constant propagation: the blocks
+// that the pass did not reach go, and the phi functions of the reached blocks they led to lose the
+// operand of the edge that came from them.
+//
+//   before (the pass reached B1 and J, not B2):  B1 -> J,  B2 -> J,  J: x.3 = phi(x.1, x.2)
+//   after:                                        B1 -> J,            J: x.3 = phi(x.1)
+//
+// Needs divided blocks and the visited marks of the pass that has just ended.
+#include "ssaopt/cfg/control_flow_graph.h"
+#include "ssaopt/ir/statement.h"
+#include "ssaopt/ir/variable.h"
+
+using ssaopt::edge;
+using ssaopt::nil;
+using ssaopt::node;
+
+namespace {
+
+// The variables at `positions` (ascending) of the operands `before` that no other operand names.
+ssaopt::set<KvCCfgVariable*> operandsNoLongerRead(const ssaopt::array<KvCCfgVariable*>& before,
+                                                  const ssaopt::array<int>& positions) {
+  ssaopt::set<KvCCfgVariable*> removed;
+  ssaopt::set<KvCCfgVariable*> kept;
+  auto nextRemoved = positions.begin();
+  for (std::size_t i = 0; i < before.size(); ++i) {
+    bool isRemoved = nextRemoved != positions.end() && static_cast<std::size_t>(*nextRemoved) == i;
+    (isRemoved ? removed : kept).insert(before[i]);
+    if (isRemoved) ++nextRemoved;
+  }
+  for (KvCCfgVariable* pVariable : kept) removed.erase(pVariable);
+  removed.erase(nullptr);
+  return removed;
+}
+
+}  // namespace
+
+// Deleting the node in hand is all that happens to the node list, so the live view serves.
+bool KvCControlFlowGraph::eliminateDeadCode() {
+  bool removedOperand = false;
+  for (node n : nodes()) {
+    if (!isDeadBlock(n)) continue;
+    while (node t = reachedPhiSuccessor(n)) {
+      removeDeadOperands(t);
+      removedOperand = true;
+    }
+    destroyDeadBlock(n);
+  }
+  forgetDeletedStatements();
+  return removedOperand;
+}
+
+// Entry and exit nodes stay, reached or not.
+bool KvCControlFlowGraph::isDeadBlock(node v) const { return !isVisited(v) && getBasicBlock(v); }
+
+node KvCControlFlowGraph::reachedPhiSuccessor(node v) const {
+  for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) {
+    node t = target(e);
+    if (isVisited(t) && phiFunctionAt(t)) return t;
+  }
+  return nil;
+}
+
+KvCPhiFunction* KvCControlFlowGraph::phiFunctionAt(node v) const {
+  KvCBasicBlock* pBlock = v ? getBasicBlock(v) : nullptr;
+  return pBlock ? pBlock->isPhiFunction() : nullptr;
+}
+
+// The operands stand in the order of t's control-flow in-edges. One walk over them finds every edge
+// from a dead block, so a phi node that many dead blocks lead to costs one walk, and a dead block with
+// two edges into it loses both operands, not one operand of a live edge.
+void KvCControlFlowGraph::removeDeadOperands(node t) {
+  ssaopt::array<int> positions = removeDeadInEdges(t);
+  for (node link = t; KvCPhiFunction* pPhi = phiFunctionAt(link); link = nextPhiChainLink(link))
+    removeOperands(link, *pPhi, positions);
+}
+
+// The positions, among t's control-flow in-edges, of those that come from dead blocks, in ascending
+// order; the edges go.
+ssaopt::array<int> KvCControlFlowGraph::removeDeadInEdges(node t) {
+  ssaopt::array<int> positions;
+  int position = 0;
+  for (edge e : in(t)) {
+    if (inf(e)->isSSAEdge()) continue;
+    if (isDeadBlock(source(e))) {
+      positions.push_back(position);
+      del_edge(e);
+    }
+    ++position;
+  }
+  return positions;
+}
+
+// Every phi function of the block that divideBasicBlock cut into the chain starting at t has one
+// operand per in-edge of t. The walk follows only the links it made: a block that held nothing but
+// phi functions is followed by another join, whose phi functions belong to other edges.
+node KvCControlFlowGraph::nextPhiChainLink(node link) const {
+  edge next = firstCfgOutEdge(link);
+  return next && isDividedBlockLink(next) ? target(next) : nil;
+}
+
+// From the back, so that each position still names the operand it named before. A variable that no
+// operand names any more is no longer used at `link`: its use set must say so, or a definition that
+// only this operand read would never count as unused.
+void KvCControlFlowGraph::removeOperands(node link, KvCPhiFunction& phi,
+                                         const ssaopt::array<int>& positions) {
+  ssaopt::array<KvCCfgVariable*> before = phi.getReplacementVariables();
+  for (auto position = positions.rbegin(); position != positions.rend(); ++position)
+    phi.delReplacement(*position);
+  for (KvCCfgVariable* pVariable : operandsNoLongerRead(before, positions)) pVariable->delUse(link);
+}
+
+// No use set may keep the node, and no payload slot the block.
+void KvCControlFlowGraph::destroyDeadBlock(node n) {
+  KvCBasicBlock* pBlock = getBasicBlock(n);
+  for (KvCCfgVariable* pVariable : pBlock->getUsedVariables()) pVariable->delUse(n);
+  while (!pBlock->getPhiFunctions().empty()) deleteStatement(*pBlock, pBlock->getPhiFunctions().front());
+  while (!pBlock->getStatementSeq().empty()) deleteStatement(*pBlock, pBlock->getStatementSeq().front());
+  assign(n, nullptr);
+  delete pBlock;
+  del_node(n);
+}
+
+bool KvCControlFlowGraph::isDividedBlockLink(edge e) const { return m_DividedBlockLinks[e]; }

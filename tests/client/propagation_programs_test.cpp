@@ -1,0 +1,487 @@
+// Constant propagation, dead-code elimination, substitution, folding and the removal of unused
+// definitions as a client sees them: programs in the textual format, put into SSA form and divided,
+// the passes, and what the program prints afterwards (with propagated values, ranges and executable
+// edges where they matter). Every internal check of the library is on and must stay silent.
+#include <sys/wait.h>
+
+#include <cctype>
+#include <cstdio>
+#include <functional>
+#include <set>
+
+#include "client_testing.h"
+#include "ssaopt/frame/report.h"
+#include "ssaopt/ir/statement.h"
+
+namespace {
+
+using Passes = std::function<void(KvCControlFlowGraph&)>;
+
+void propagate(KvCControlFlowGraph& G) { G.propagateSparseConditionalConstant(true); }
+void propagateKeepingDeadCode(KvCControlFlowGraph& G) { G.propagateSparseConditionalConstant(false); }
+void removeUnused(KvCControlFlowGraph& G) { G.removeUnusedVarDefs(); }
+// From propagation to the removal of unused definitions, as the typical run does.
+void optimise(KvCControlFlowGraph& G) {
+  G.propagateSparseConditionalConstant(true);
+  G.replaceConstantVariables();
+  G.foldConstants();
+  G.removeUnusedVarDefs();
+}
+
+class Optimisation : public clienttest::ClientTest {
+protected:
+  Optimisation() { ssaopt::setShowInternalInfo(true); }
+  ~Optimisation() override { ssaopt::setShowInternalInfo(false); }
+  void TearDown() override {
+    EXPECT_TRUE(m_Log.empty()) << "the library reported " << m_Log.count() << " fault(s)";
+  }
+
+  // `text` put into SSA form and divided, then `passes`, printed.
+  std::string optimised(const std::string& text, const Passes& passes, bool showValues = false) {
+    ssaopt::client::Program* pProgram = load(text);
+    if (!pProgram) return "";
+    toDividedSSA(*pProgram);
+    passes(pProgram->graph());
+    return ssaopt::client::printProgram(*pProgram, ssaopt::client::PrintOptions{showValues});
+  }
+  static void toDividedSSA(ssaopt::client::Program& program) {
+    program.completeCallLists();
+    program.graph().transformToSSAForm();
+    program.transformKeepingLabels([&program] { program.graph().divideBasicBlock(); });
+  }
+
+  // The lines of `printed` from the first that starts with `first` to the next that starts with
+  // `last`, both included.
+  static std::string lines(const std::string& printed, const std::string& first, const std::string& last) {
+    std::size_t begin = printed.find("\n" + first);
+    if (begin == std::string::npos) return "";
+    std::size_t lastLine = printed.find("\n" + last, begin + 1);
+    if (lastLine == std::string::npos) return "";
+    return printed.substr(begin + 1, printed.find('\n', lastLine + 1) - begin);
+  }
+
+  // `printed` with every block number replaced by #: where blocks are numbered depends on how many
+  // the test made before.
+  static std::string withoutBlockNumbers(const std::string& printed) {
+    auto digitAt = [&printed](std::size_t i) {
+      return i < printed.size() && std::isdigit(static_cast<unsigned char>(printed[i]));
+    };
+    std::string text;
+    for (std::size_t i = 0; i < printed.size(); ++i) {
+      text += printed[i];
+      if (i == 0 || printed.compare(i - 1, 2, "bb") != 0 || !digitAt(i + 1)) continue;
+      text += '#';
+      while (digitAt(i + 1)) ++i;
+    }
+    return text;
+  }
+
+  ssaopt::ReportLog m_Log;
+};
+
+// ---- The typical run ----------------------------------------------------------------------------
+
+// The branch on enabled, set to 1 just before, is decided: the false branch goes, the constant takes
+// the place of the reads, and no definition of enabled or limit is left.
+TEST_F(Optimisation, TheTypicalRunDecidesItsBranchAndKeepsOnlyWhatIsRead) {
+  ssaopt::client::Program* pProgram = load(clienttest::readExample("typical_run"));
+  ASSERT_NE(pProgram, nullptr);
+  pProgram->graph().inlineProcedures();
+  pProgram->graph().insertValidConditionAssignments();
+  toDividedSSA(*pProgram);
+  optimise(pProgram->graph());
+
+  EXPECT_EQ(ssaopt::client::printProgram(*pProgram),
+            "var bool enabled erasable = 0;\n"
+            "var int16 speed volatile;\n"
+            "var int16 limit erasable = 0;\n"
+            "var int16 command output = 0;\n"
+            "\n"
+            "proc #main {\n"
+            "  init speed.1 = 0;\n"
+            "bb31:\n"
+            "  init command.1 = 0;\n"
+            "  goto bb12;\n"
+            "bb5:\n"
+            "  goto bb22;\n"
+            "bb7:\n"
+            "  command.4 = speed.1;\n"
+            "  if command.4 > 100 goto clamp else bb5;\n"
+            "bb12:\n"
+            "  command.2 = phi(command.1 from bb31, command.3 from bb25);\n"
+            "  if 1 goto bb26 else removed;\n"
+            "clamp:\n"
+            "  command.5 = 100;\n"
+            "bb22:\n"
+            "  command.3 = phi(command.5 from clamp, command.4 from bb5);\n"
+            "bb25:\n"
+            "  if ? goto bb12 else bb32;\n"
+            "bb26:\n"
+            "  goto bb7;\n"
+            "bb32:\n"
+            "  output command.3;\n"
+            "}\n");
+}
+
+// ---- Conditions ----------------------------------------------------------------------------------
+
+std::string branchOn(const char* definitionOfK) {
+  return std::string(
+             "var int16 k erasable = 0;\n"
+             "var int16 in volatile;\n"
+             "var int16 x output = 0;\n"
+             "proc #main {\n  ") +
+         definitionOfK +
+         "\n"
+         "  if k goto yes else no;\n"
+         "yes:\n"
+         "  x = 1;\n"
+         "  goto end;\n"
+         "no:\n"
+         "  x = 2;\n"
+         "}\n";
+}
+
+// The join merges the operand of the branch never taken, still undetermined, so it stays
+// undetermined itself until dead-code elimination removes that operand.
+TEST_F(Optimisation, AConditionConstantZeroOpensOnlyTheFalseEdge) {
+  std::string printed = optimised(branchOn("k = 0;"), propagateKeepingDeadCode, true);
+  EXPECT_EQ(lines(printed, "  k.3 = 0;", "bb12:"),
+            "  k.3 = 0;  // 0 in [0, 0]\n"
+            "  if k.3 goto yes else no;\n"
+            "  // to yes: not executable, to no: executable\n"
+            "yes:\n"
+            "  x.3 = 1;  // ? in [?, ?]\n"
+            "  goto bb12;\n"
+            "no:\n"
+            "  x.4 = 2;  // 2 in [2, 2]\n"
+            "bb12:\n");
+  EXPECT_NE(printed.find("  x.5 = phi(x.3 from yes, x.4 from no);  // ? in [?, ?]\n"), std::string::npos);
+}
+
+TEST_F(Optimisation, ConditionReplacementPutsTheOutcomeInPlaceOfAConstantCondition) {
+  std::string printed = optimised(
+      "var int16 k erasable = 0;\n"
+      "var int16 x output = 0;\n"
+      "proc #main {\n"
+      "  k = 5;\n"
+      "  x = k;\n"
+      "  if k > 3 goto yes else end;\n"
+      "yes:\n"
+      "  x = 1;\n"
+      "}\n",
+      [](KvCControlFlowGraph& G) {
+        propagate(G);
+        G.replaceConstantConditions();
+      });
+  EXPECT_NE(printed.find("  x.3 = k.3;\n  if 1 goto yes else removed;\n"), std::string::npos) << printed;
+}
+
+// ---- Unreached blocks ----------------------------------------------------------------------------
+
+// The join's in-edges come from the blocks in the order they are written; d, never reached, stands
+// first, in the middle or last. Both phi functions of the join, a chain after division, lose its
+// operand.
+std::string joinAfter(const char* blocks) {
+  return std::string(
+             "var int16 s volatile;\n"
+             "var bool never erasable = 0;\n"
+             "var int16 x = 0;\n"
+             "var int16 y = 0;\n"
+             "var int16 o output = 0;\n"
+             "proc #main {\n"
+             "  never = 0;\n"
+             "  if s == 1 goto a else pick;\n"
+             "pick:\n"
+             "  if never goto d else b;\n") +
+         blocks +
+         "join:\n"
+         "  o = x + y;\n"
+         "}\n";
+}
+
+const char* const kA = "a:\n  x = 1;\n  y = 10;\n  goto join;\n";
+const char* const kB = "b:\n  x = 2;\n  y = 20;\n  goto join;\n";
+const char* const kD = "d:\n  x = 3;\n  y = 30;\n  goto join;\n";
+
+TEST_F(Optimisation, AnUnreachedBlockGoesWithItsOperandInEveryPhiFunctionOfTheJoin) {
+  for (const std::string& blocks :
+       {std::string(kD) + kA + kB, std::string(kA) + kD + kB, std::string(kA) + kB + kD}) {
+    std::string printed = withoutBlockNumbers(optimised(joinAfter(blocks.c_str()), propagate));
+    EXPECT_EQ(lines(printed, "pick:", "  o.3 = "),
+              "pick:\n"
+              "  if never.3 goto removed else b;\n"
+              "a:\n"
+              "  x.4 = 1;\n"
+              "bb#:\n"
+              "  y.4 = 10;\n"
+              "  goto join;\n"
+              "b:\n"
+              "  x.3 = 2;\n"
+              "bb#:\n"
+              "  y.3 = 20;\n"
+              "join:\n"
+              "  x.5 = phi(x.4 from bb#, x.3 from bb#);\n"
+              "  y.5 = phi(y.4 from bb#, y.3 from bb#);\n"
+              "  o.3 = x.5 + y.5;\n")
+        << blocks;
+  }
+}
+
+// Regression: a dead block with both branch edges into one join. The second edge's position was
+// counted with the first edge, whose operand was already gone, still among the in-edges, and took
+// the operand of the edge from live: y became 2 where it is 1.
+TEST_F(Optimisation, ADeadBranchWithBothEdgesIntoOneJoinLeavesTheOperandsOfTheLiveEdges) {
+  std::string printed = optimised(
+      "var bool a volatile;\n"
+      "var bool c volatile;\n"
+      "var bool k erasable = 0;\n"
+      "var int16 x = 0;\n"
+      "var int16 y output = 0;\n"
+      "proc #main {\n"
+      "  k = 0;\n"
+      "  x = 7;\n"
+      "  if a goto live else maybe;\n"
+      "maybe:\n"
+      "  if k goto dead else join;\n"
+      "dead:\n"
+      "  x = 2;\n"
+      "  if c goto join else join;\n"
+      "live:\n"
+      "  x = 1;\n"
+      "join:\n"
+      "  y = x;\n"
+      "}\n",
+      propagate);
+  EXPECT_EQ(lines(printed, "maybe:", "  y.3"),
+            "maybe:\n"
+            "  if k.3 goto removed else join;\n"
+            "live:\n"
+            "  x.4 = 1;\n"
+            "join:\n"
+            "  x.5 = phi(x.3 from maybe, x.4 from live);\n"
+            "  y.3 = x.5;\n");
+}
+
+// Regression: if (a) { if (b) x = 1; else x = 2; } else x = 3; y = x; with b constant. The inner
+// join holds nothing but its phi function; the operand walk ran on from it into the outer join and
+// took the operand of x = 3 there, so y was folded to 1.
+TEST_F(Optimisation, TheOperandWalkOfAnInnerJoinStopsAtTheOuterJoin) {
+  std::string printed = optimised(
+      "var bool a volatile;\n"
+      "var bool b erasable = 0;\n"
+      "var int16 x = 0;\n"
+      "var int16 y output = 0;\n"
+      "proc #main {\n"
+      "  b = 1;\n"
+      "  if a goto outer else three;\n"
+      "outer:\n"
+      "  if b goto one else two;\n"
+      "one:\n"
+      "  x = 1;\n"
+      "  goto inner;\n"
+      "two:\n"
+      "  x = 2;\n"
+      "inner:\n"
+      "  goto join;\n"
+      "three:\n"
+      "  x = 3;\n"
+      "join:\n"
+      "  y = x;\n"
+      "}\n",
+      optimise);
+  EXPECT_EQ(lines(printed, "inner:", "  y.3"),
+            "inner:\n"
+            "  x.4 = phi(x.3 from one);\n"
+            "  goto join;\n"
+            "three:\n"
+            "  x.5 = 3;\n"
+            "join:\n"
+            "  x.6 = phi(x.4 from inner, x.5 from three);\n"
+            "  y.3 = x.6;\n");
+}
+
+// ---- Ranges --------------------------------------------------------------------------------------
+
+// level is read with its declared range [0, 100]. The regression: int8 narrow = level + 100 cast
+// [100, 200] to [100, -56]; such a range now has no bounds.
+TEST_F(Optimisation, RangesAreSaturatedScaledAndDroppedWhenTheyWrapAroundTheirType) {
+  std::string printed = optimised(
+      "var int16 level volatile saturate(0..100);\n"
+      "var int16 boosted saturate(..150) output = 0;\n"
+      "var int16 half scale(0.5) output = 0;\n"
+      "var int8 narrow output = 0;\n"
+      "var int16 wide output = 0;\n"
+      "proc #main {\n"
+      "  boosted = level + 100;\n"
+      "  half = level / 3;\n"
+      "  narrow = level + 100;\n"
+      "  wide = level + 100;\n"
+      "}\n",
+      propagate, true);
+  EXPECT_EQ(lines(printed, "  boosted.3", "  wide.3"),
+            "  boosted.3 = level.1 + 100;  // * in [100, 150]\n"
+            "  half.3 = level.1 / 3;  // * in [0, 33.5]\n"
+            "  narrow.3 = level.1 + 100;  // * in [*, *]\n"
+            "  wide.3 = level.1 + 100;  // * in [100, 200]\n");
+}
+
+// ---- Procedures ----------------------------------------------------------------------------------
+
+// The caller's constant reaches the callee's parameter, and the callee's result comes back, whether
+// the caller's name sorts before the callee's ("first", "second") or after it ("caller", "callee").
+// The executable flags left are those of the procedure processed last, so none in #main.
+TEST_F(Optimisation, ACallLinksTheArgumentAndTheReturnedValueInEitherNameOrder) {
+  for (auto names : {std::make_pair("first", "second"), std::make_pair("caller", "callee")}) {
+    std::string caller = names.first, callee = names.second;
+    std::string printed =
+        withoutBlockNumbers(optimised("var int16 n erasable = 0;\n"
+                                      "var int16 p = 0;\n"
+                                      "var int16 m = 0;\n"
+                                      "var int16 r output = 0;\n"
+                                      "proc #main {\n"
+                                      "  call " +
+                                          caller +
+                                          "();\n"
+                                          "}\n"
+                                          "proc " +
+                                          caller +
+                                          " {\n"
+                                          "  n = 5;\n"
+                                          "  call " +
+                                          callee +
+                                          "(n);\n"
+                                          "  r = m;\n"
+                                          "}\n"
+                                          "proc " +
+                                          callee +
+                                          "(p) {\n"
+                                          "  m = p + 1;\n"
+                                          "}\n",
+                                      propagate, true));
+    EXPECT_EQ(lines(printed, "  p.6", "  m.7"), "  p.6 = param(n.5 from " + caller +
+                                                    ":bb#);  // 5 in [5, 5]\n"
+                                                    "  m.6 = param(m.4 from " +
+                                                    caller +
+                                                    ":bb#);  // * in [*, *]\n"
+                                                    "  m.7 = p.6 + 1;  // 6 in [6, 6]\n");
+    EXPECT_NE(printed.find("  r.5 = m.5;  // 6 in [6, 6]\n"), std::string::npos) << printed;
+    EXPECT_NE(printed.find("  r.3 = return(r.5);  // 6 in [6, 6]\n"), std::string::npos) << printed;
+    EXPECT_NE(printed.find("  // to bb#: not executable, to bb#: not executable\n"), std::string::npos);
+  }
+}
+
+// ---- Unused definitions --------------------------------------------------------------------------
+
+// The chain f, g, h goes whole, with the initial values and loop phi functions of its variables.
+// What stays: the definition of a, whose volatile read is a side effect, an element write, and the
+// definitions of a variable that is not erasable.
+TEST_F(Optimisation, UnusedDefinitionsGoInChainsAndWhatMayNotGoStays) {
+  std::string printed = optimised(
+      "var int16 in volatile;\n"
+      "var int16 a erasable = 0;\n"
+      "var int16 f erasable = 0;\n"
+      "var int16 g erasable = 0;\n"
+      "var int16 h erasable = 0;\n"
+      "var int16 table[4] erasable;\n"
+      "var int16 kept = 0;\n"
+      "proc #main {\n"
+      "  a = in;\n"
+      "  f = 1;\n"
+      "  g = f + 1;\n"
+      "  h = g * 2;\n"
+      "  table[0] = 7;\n"
+      "  kept = 2;\n"
+      "}\n",
+      removeUnused);
+  EXPECT_EQ(lines(withoutBlockNumbers(printed), "proc #main", "}"),
+            "proc #main {\n"
+            "  init in.1 = 0;\n"
+            "  init table.1 = 0;\n"
+            "bb#:\n"
+            "  init kept.1 = 0;\n"
+            "bb#:\n"
+            "  table.2 = phi(table.1 from bb#, table.3 from bb#);\n"
+            "  kept.2 = phi(kept.1 from bb#, kept.3 from bb#);\n"
+            "  a.1 = in.1;\n"
+            "  table.3 = table.2 with [0] = 7;\n"
+            "  kept.3 = 2;\n"
+            "bb#:\n"
+            "  if ? goto bb# else end;\n"
+            "}\n");
+}
+
+// ---- What the procedure records keep -------------------------------------------------------------
+
+// Every call, parameter statement and value-return statement that a procedure record lists, and every
+// call a parameter statement holds an argument for, still stands in a block.
+void expectRecordsNameOnlyLiveStatements(KvCControlFlowGraph& G) {
+  std::set<const KvCCfgStatement*> live;
+  for (ssaopt::node v : G.nodes())
+    if (KvCBasicBlock* pBlock = G.getBasicBlock(v)) {
+      for (KvCCfgStatement* pStatement : pBlock->getStatementSeq()) live.insert(pStatement);
+      for (KvCPhiFunction* pPhi : pBlock->getPhiFunctions()) live.insert(pPhi);
+    }
+  for (const auto& entry : G.getProcedures()) {
+    KvCCfgProcedure& procedure = *entry.second;
+    for (KvCCfgProcedureCall* pCall : procedure.getCalls()) EXPECT_TRUE(live.count(pCall)) << entry.first.cstring();
+    for (KvCCfgValueReturnStatement* pReturn : procedure.getValueReturnStatements())
+      EXPECT_TRUE(live.count(pReturn)) << entry.first.cstring();
+    for (KvCCfgParamStatement* pParam : procedure.getParamStatements()) {
+      EXPECT_TRUE(live.count(pParam)) << entry.first.cstring();
+      for (const auto& argument : pParam->getArguments()) EXPECT_TRUE(live.count(argument.first));
+    }
+  }
+}
+
+// A call that dead-code elimination deleted with its block, and the interface statements that it or
+// the removal of unused definitions deleted, stayed listed in the procedure records.
+TEST_F(Optimisation, RegressionProcedureRecordsForgetDeletedStatements) {
+  ssaopt::client::Program* pProgram = load(
+      "var int16 x erasable = 0;\n"
+      "var int16 p erasable;\n"
+      "var int16 t erasable;\n"
+      "var int16 y output = 0;\n"
+      "proc #main {\n"
+      "  x = 0;\n"
+      "  if x goto dead else live;\n"
+      "dead:\n"
+      "  call f(1);\n"
+      "  goto end;\n"
+      "live:\n"
+      "  call f(2);\n"
+      "}\n"
+      "proc f(p) { t = p; y = t; }\n");
+  ASSERT_NE(pProgram, nullptr);
+  toDividedSSA(*pProgram);
+  KvCControlFlowGraph& G = pProgram->graph();
+  KvCCfgProcedure* pF = G.findProcedure("f");
+  ASSERT_NE(pF, nullptr);
+  ASSERT_EQ(pF->getCalls().size(), 2u);
+  std::size_t returnsBefore = pF->getValueReturnStatements().size();
+  optimise(G);
+  EXPECT_EQ(pF->getCalls().size(), 1u);
+  EXPECT_LT(pF->getValueReturnStatements().size(), returnsBefore);
+  for (KvCCfgParamStatement* pParam : pF->getParamStatements()) EXPECT_EQ(pParam->getArguments().size(), 1u);
+  expectRecordsNameOnlyLiveStatements(G);
+}
+
+// ---- Behaviour -----------------------------------------------------------------------------------
+
+// The tool's check runs each example before and after the typical run on seeded inputs.
+TEST(OptimisationBehaviour, EveryExampleBehavesTheSameAfterTheTypicalRun) {
+  for (const char* name : clienttest::kExamples) {
+    std::string command =
+        std::string(SSAOPT_TOOL) + " check " + SSAOPT_EXAMPLES_DIR + "/" + name + ".ssa 2>&1";
+    std::FILE* pPipe = popen(command.c_str(), "r");
+    ASSERT_NE(pPipe, nullptr);
+    std::string out;
+    char buffer[4096];
+    for (std::size_t n; (n = std::fread(buffer, 1, sizeof buffer, pPipe)) > 0;) out.append(buffer, n);
+    int status = pclose(pPipe);
+    EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << name << "\n" << out;
+    EXPECT_NE(out.find("same behaviour"), std::string::npos) << name << "\n" << out;
+  }
+}
+
+}  // namespace

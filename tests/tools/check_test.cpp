@@ -1,0 +1,148 @@
+// The run and check commands of the ssaopt tool as a user runs them: what they print, where, and
+// their exit status.
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+
+#include <cstdlib>
+#include <fstream>
+#include <sstream>
+#include <string>
+
+namespace {
+
+const char* const kExamples[] = {"typical_run", "controller", "procedures", "loop", "outline"};
+
+struct Result {
+  int status;
+  std::string out;
+  std::string err;
+};
+
+// A path of the running test's own, so that tests may run in parallel.
+std::string pathOf(const std::string& name) {
+  const ::testing::TestInfo* pTest = ::testing::UnitTest::GetInstance()->current_test_info();
+  return ::testing::TempDir() + "ssaopt_check_" + pTest->name() + "_" + name;
+}
+
+std::string contentsOf(const std::string& path) {
+  std::ifstream file(path);
+  std::ostringstream text;
+  text << file.rdbuf();
+  return text.str();
+}
+
+std::string fileWith(const std::string& name, const std::string& text) {
+  std::ofstream(pathOf(name)) << text;
+  return pathOf(name);
+}
+
+Result ssaopt(const std::string& arguments) {
+  std::string command =
+      std::string(SSAOPT_TOOL) + " " + arguments + " >'" + pathOf("out") + "' 2>'" + pathOf("err") + "'";
+  int status = std::system(command.c_str());
+  return Result{WIFEXITED(status) ? WEXITSTATUS(status) : -1, contentsOf(pathOf("out")),
+                contentsOf(pathOf("err"))};
+}
+
+std::string example(const char* name) { return std::string(SSAOPT_EXAMPLES_DIR) + "/" + name + ".ssa"; }
+
+// The trace without its last line, which counts the statements the run executed.
+std::string eventsOf(const std::string& trace) {
+  return trace.substr(0, trace.rfind('\n', trace.size() - 2) + 1);
+}
+
+TEST(ToolCheck, EveryExampleBehavesTheSameAfterTheDefaultPipeline) {
+  for (const char* name : kExamples) {
+    Result result = ssaopt("check " + example(name));
+    EXPECT_EQ(result.status, 0) << name << "\n" << result.out << result.err;
+    EXPECT_EQ(result.out, "same behaviour on 20 runs\n") << name;
+  }
+}
+
+TEST(ToolCheck, RunsThatHitAGuardAreListedAndCountForNothing) {
+  std::string path = fileWith("spin.ssa",
+                              "var int16 v volatile;\n"
+                              "var int16 x = 0;\n"
+                              "proc #main {\n"
+                              "  x = v;\n"
+                              "spin:\n"
+                              "  if x >= -32768 goto spin else end;\n"
+                              "}\n");
+  Result result = ssaopt("check " + path + " --runs 2 --steps=3 --seed 5");
+  EXPECT_EQ(result.status, 0) << result.err;
+  EXPECT_EQ(result.out,
+            "input seed 5: the original program is inconclusive in step 1: more than 1000000 statements in "
+            "one step\n"
+            "input seed 6: the original program is inconclusive in step 1: more than 1000000 statements in "
+            "one step\n"
+            "same behaviour on 0 runs, 2 inconclusive\n");
+}
+
+TEST(ToolRun, PrintsTheTraceOfTheProgramAsWritten) {
+  std::string values = fileWith("values", "level 150 3  # too high, then low\n");
+  Result result = ssaopt("run " + example("outline") + " --steps 2 --inputs " + values);
+  EXPECT_EQ(result.status, 0) << result.err;
+  EXPECT_EQ(eventsOf(result.out),
+            "step 1: extern log_event(alarm = 1, count = 1)\n"
+            "step 2: extern log_event(alarm = 0, count = 2)\n"
+            "output alarm = 0\n");
+  EXPECT_EQ(result.out.substr(eventsOf(result.out).size()).rfind("completed 2 steps (", 0), 0u) << result.out;
+}
+
+TEST(ToolRun, ASeedGivesOneTraceBeforeAndAfterThePipeline) {
+  std::string asWritten = ssaopt("run " + example("procedures") + " --steps 4 --seed 9").out;
+  EXPECT_EQ(eventsOf(ssaopt("run " + example("procedures") + " --steps 4 --seed 9").out),
+            eventsOf(asWritten));
+  EXPECT_EQ(
+      eventsOf(
+          ssaopt("run --passes=inline,ssa,divide,sccp " + example("procedures") + " --steps 4 --seed 9").out),
+      eventsOf(asWritten));
+  EXPECT_NE(eventsOf(ssaopt("run " + example("procedures") + " --steps 4 --seed 10").out),
+            eventsOf(asWritten));
+}
+
+TEST(ToolRun, InputValuesThatCannotBeReadAreAnError) {
+  Result missing = ssaopt("run " + example("loop") + " --inputs " + pathOf("nonexistent"));
+  EXPECT_EQ(missing.status, 1);
+  EXPECT_EQ(missing.err, "ssaopt: " + pathOf("nonexistent") + ": cannot read the file\n");
+  std::string values = fileWith("values", "table 1 2\ntable three\n");
+  Result malformed = ssaopt("run " + example("loop") + " --inputs " + values);
+  EXPECT_EQ(malformed.status, 1);
+  EXPECT_EQ(malformed.err, "ssaopt: " + values + ": line 2: expected a variable name and numbers\n");
+  EXPECT_EQ(malformed.out, "");
+}
+
+TEST(ToolRun, AProgramWithErrorsIsReportedAsByTheTransformingTool) {
+  std::string path = fileWith("error.ssa", "var int16 x;\nproc #main {\n  x = y;\n}\n");
+  for (const char* command : {"run ", "check "}) {
+    Result result = ssaopt(command + path);
+    EXPECT_EQ(result.status, 1) << command;
+    EXPECT_EQ(result.err, path + ":3:7: error: unknown variable 'y'\n") << command;
+  }
+}
+
+TEST(ToolBehaviourUsage, OptionsOfTheCommandsBelongToThem) {
+  struct Case {
+    const char* arguments;
+    const char* error;
+  };
+  const Case kCases[] = {
+      {"x.ssa --steps 3", "--steps, --runs, --seed and --inputs belong to the run and check commands"},
+      {"run x.ssa --runs 3", "--runs belongs to the check command"},
+      {"check x.ssa --inputs v.txt", "--inputs belongs to the run command"},
+      {"check x.ssa --steps 0", "--steps and --runs need at least 1"},
+      {"check x.ssa --seed abc", "--seed needs a whole number, not 'abc'"},
+      {"run x.ssa --steps", "--steps needs a value"},
+      {"check", "no input file"},
+  };
+  for (const Case& wrong : kCases) {
+    Result result = ssaopt(wrong.arguments);
+    EXPECT_EQ(result.status, 2) << wrong.arguments;
+    EXPECT_EQ(result.err.rfind(std::string("ssaopt: ") + wrong.error + "\n", 0), 0u) << result.err;
+  }
+  Result unknownPass = ssaopt("check --passes=ssa,nosuch " + example("loop"));
+  EXPECT_EQ(unknownPass.status, 2);
+  EXPECT_EQ(unknownPass.err.rfind("ssaopt: unknown pass 'nosuch'; known passes: ", 0), 0u) << unknownPass.err;
+}
+
+}  // namespace

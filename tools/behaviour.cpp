@@ -1,0 +1,106 @@
+#include "behaviour.h"
+
+#include <fstream>
+#include <memory>
+#include <sstream>
+
+#include "passes.h"
+#include "ssaopt/client/front_end.h"
+#include "ssaopt/client/interpreter.h"
+#include "ssaopt/frame/control.h"
+#include "ssaopt/frame/pool.h"
+
+namespace ssaopt::tool {
+
+namespace {
+
+constexpr int kFailure = 1;
+constexpr int kUnknownPass = 2;
+
+class BehaviourCommand {
+public:
+  BehaviourCommand(const Options& options, std::ostream& out, std::ostream& err)
+      : m_Options(options), m_Out(out), m_Err(err) {}
+
+  int execute() {
+    // run shows the program as written unless told otherwise; check is about the pipeline.
+    std::vector<std::string> pipeline = m_Options.passes.value_or(
+        m_Options.command == Command::Run ? std::vector<std::string>() : defaultPipeline());
+    std::string unknown = findUnknownPass(pipeline);
+    if (!unknown.empty()) {
+      m_Err << "ssaopt: " << unknown << "\n";
+      return kUnknownPass;
+    }
+    m_Control.boot();
+    int status = m_Options.command == Command::Run ? run(pipeline) : check(pipeline);
+    m_Control.shutdown();
+    return status;
+  }
+
+private:
+  int run(const std::vector<std::string>& pipeline) {
+    std::unique_ptr<client::Program> pProgram = load(pipeline, true);
+    std::unique_ptr<client::InputStreams> pInputs = openInputs();
+    if (!pProgram || !pInputs) return kFailure;
+    client::RunLimits limits;
+    limits.steps = m_Options.steps.value_or(kDefaultSteps);
+    m_Out << client::formatTrace(client::Interpreter(*pProgram).run(limits, *pInputs));
+    return 0;
+  }
+
+  int check(const std::vector<std::string>& pipeline) {
+    std::unique_ptr<client::Program> pOriginal = load({}, true);
+    if (!pOriginal) return kFailure;
+    std::unique_ptr<client::Program> pTransformed = load(pipeline, false);
+    client::CheckSettings settings;
+    settings.runs = m_Options.runs.value_or(kDefaultRuns);
+    settings.firstSeed = m_Options.seed.value_or(kDefaultSeed);
+    settings.limits.steps = m_Options.steps.value_or(kDefaultSteps);
+    client::CheckReport report = client::checkBehaviour(*pOriginal, *pTransformed, settings);
+    m_Out << client::formatReport(report);
+    return report.difference ? kFailure : 0;
+  }
+
+  // The program after `pipeline`, or null after its errors were shown. The second load of a file
+  // that loaded once shows the same warnings again, so only one shows them.
+  std::unique_ptr<client::Program> load(const std::vector<std::string>& pipeline, bool showDiagnostics) {
+    client::LoadResult loaded = client::loadProgramFile(m_Options.inputPath);
+    for (const client::Diagnostic& diagnostic : loaded.diagnostics)
+      if (showDiagnostics || !loaded.program)
+        m_Err << client::formatDiagnostic(m_Options.inputPath, diagnostic) << "\n";
+    if (loaded.program) runPipeline(pipeline, *loaded.program);
+    return std::move(loaded.program);
+  }
+
+  std::unique_ptr<client::InputStreams> openInputs() {
+    if (!m_Options.inputsPath)
+      return std::make_unique<client::SeededInputs>(m_Options.seed.value_or(kDefaultSeed));
+    std::ifstream file(*m_Options.inputsPath);
+    std::ostringstream text;
+    text << file.rdbuf();
+    std::string error = file.is_open() ? "" : "cannot read the file";
+    std::optional<client::ListedInputs> inputs;
+    if (error.empty()) inputs = client::ListedInputs::parse(text.str(), error);
+    if (!inputs) {
+      m_Err << "ssaopt: " << *m_Options.inputsPath << ": " << error << "\n";
+      return nullptr;
+    }
+    return std::make_unique<client::ListedInputs>(std::move(*inputs));
+  }
+
+  const Options& m_Options;
+  std::ostream& m_Out;
+  std::ostream& m_Err;
+  // The pool takes back what the graph never deletes; the programs live inside run() and check().
+  ssaopt::PoolMemController m_Pool;
+  ssaopt::PoolMemController::Scope m_PoolScope{&m_Pool};
+  KvCSSAControl m_Control;
+};
+
+}  // namespace
+
+int runBehaviourCommand(const Options& options, std::ostream& out, std::ostream& err) {
+  return BehaviourCommand(options, out, err).execute();
+}
+
+}  // namespace ssaopt::tool

@@ -1,0 +1,171 @@
+#include "driver.h"
+
+#include <chrono>
+#include <fstream>
+#include <iomanip>
+#include <memory>
+#include <optional>
+
+#include "passes.h"
+#include "ssaopt/client/dot.h"
+#include "ssaopt/client/front_end.h"
+#include "ssaopt/client/printer.h"
+#include "ssaopt/frame/control.h"
+#include "ssaopt/frame/pool.h"
+#include "ssaopt/frame/report.h"
+#include "ssaopt/ir/edge_info.h"
+#include "statistics.h"
+
+namespace ssaopt::tool {
+
+namespace {
+
+constexpr int kFailure = 1;
+constexpr int kUnknownPass = 2;
+
+using Clock = std::chrono::steady_clock;
+
+bool hasSSAEdges(const KvCControlFlowGraph& graph) {
+  for (ssaopt::edge e : graph.edges())
+    if (graph.inf(e)->isSSAEdge()) return true;
+  return false;
+}
+
+// Switches the library's internal checks on for the run and records what they report.
+class Verification {
+public:
+  Verification() { ssaopt::setShowInternalInfo(true); }
+  ~Verification() { ssaopt::setShowInternalInfo(false); }
+  Verification(const Verification&) = delete;
+  Verification& operator=(const Verification&) = delete;
+
+  // The check every transformation keeps, reported as the SSA driver reports it. It counts connected
+  // components, one per procedure, which holds for the control flow only: SSA edges link definitions
+  // in a procedure to their uses in its callers, so the check waits until they are gone again.
+  void checkGraph(const KvCControlFlowGraph& graph, const std::string& after) {
+    if (hasSSAEdges(graph)) return;
+    if (!graph.checkConsistency()) ssaopt::reportConsistencyFailure(after.c_str(), 0, "checkConsistency()");
+  }
+
+  // Writes every report; true when there was none.
+  bool writeReports(std::ostream& err) const {
+    for (const std::string& message : m_Log.messages()) err << "ssaopt: verify: " << message << "\n";
+    for (const ssaopt::ReportLog::Consistency& failure : m_Log.consistencyFailures())
+      err << "ssaopt: verify: consistency condition \"" << failure.condition << "\" failed (" << failure.file
+          << ":" << failure.line << ")\n";
+    if (!m_Log.empty()) err << "ssaopt: verify: " << m_Log.count() << " report(s)\n";
+    return m_Log.empty();
+  }
+
+private:
+  ssaopt::ReportLog m_Log;
+};
+
+class Run {
+public:
+  Run(const Options& options, std::ostream& out, std::ostream& err)
+      : m_Options(options), m_Out(out), m_Err(err) {}
+
+  int execute() {
+    std::vector<std::string> pipeline = m_Options.passes.value_or(defaultPipeline());
+    if (!checkPipeline(pipeline)) return kUnknownPass;
+    m_Control.boot();
+    if (m_Options.verify) m_Verification.emplace();
+    if (!load()) return kFailure;
+    if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), "the front end");
+    GraphCounts before = countGraph(m_pProgram->graph());
+    for (const std::string& name : pipeline) runPass(*findPass(name));
+    writeNotices();
+    bool written = writeResult();
+    if (m_Options.stats)
+      writeStatistics(m_Err, before, countGraph(m_pProgram->graph()), m_DefinitionsRemoved);
+    if (m_Options.timePasses) writeTimes();
+    bool verified = !m_Verification || m_Verification->writeReports(m_Err);
+    m_Control.shutdown();
+    return written && verified ? 0 : kFailure;
+  }
+
+private:
+  bool checkPipeline(const std::vector<std::string>& pipeline) {
+    std::string unknown = findUnknownPass(pipeline);
+    if (!unknown.empty()) m_Err << "ssaopt: " << unknown << "\n";
+    return unknown.empty();
+  }
+
+  bool load() {
+    client::LoadResult loaded = client::loadProgramFile(m_Options.inputPath);
+    for (const client::Diagnostic& diagnostic : loaded.diagnostics)
+      m_Err << client::formatDiagnostic(m_Options.inputPath, diagnostic) << "\n";
+    m_pProgram = std::move(loaded.program);
+    return m_pProgram != nullptr;
+  }
+
+  void runPass(const Pass& pass) {
+    std::size_t definitions = m_Options.stats ? countGraph(m_pProgram->graph()).definitions : 0;
+    Clock::time_point start = Clock::now();
+    pass.run(*m_pProgram);
+    m_Times.emplace_back(pass.name, std::chrono::duration<double, std::milli>(Clock::now() - start).count());
+    if (m_Options.stats) {
+      std::size_t left = countGraph(m_pProgram->graph()).definitions;
+      if (left < definitions) m_DefinitionsRemoved += definitions - left;
+    }
+    if (m_Options.printAfterAll)
+      m_Err << "// ---- after " << pass.name << " ----\n" << client::printProgram(*m_pProgram);
+    if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), std::string("pass ") + pass.name);
+  }
+
+  // What the client's expressions noticed while the passes ran.
+  void writeNotices() {
+    for (const client::Notice& notice : m_pProgram->expressions().notices())
+      m_Err << client::formatDiagnostic(m_Options.inputPath,
+                                        {client::Severity::Warning, notice.pos, notice.message})
+            << "\n";
+  }
+
+  bool writeResult() {
+    std::string result = m_Options.emit == Emit::Dot
+                             ? client::writeDot(*m_pProgram)
+                             : client::printProgram(*m_pProgram, client::PrintOptions{m_Options.showValues});
+    if (m_Options.outputPath.empty()) {
+      m_Out << result;
+      return true;
+    }
+    std::ofstream file(m_Options.outputPath, std::ios::binary);
+    file << result;
+    if (file.flush()) return true;
+    m_Err << "ssaopt: cannot write '" << m_Options.outputPath << "'\n";
+    return false;
+  }
+
+  void writeTimes() {
+    double total = 0;
+    for (const auto& time : m_Times) {
+      m_Err << "time " << std::left << std::setw(20) << time.first << std::right << std::fixed
+            << std::setprecision(3) << std::setw(12) << time.second << " ms\n";
+      total += time.second;
+    }
+    m_Err << "time " << std::left << std::setw(20) << "total" << std::right << std::setw(12) << total
+          << " ms\n";
+  }
+
+  const Options& m_Options;
+  std::ostream& m_Out;
+  std::ostream& m_Err;
+  // The pool takes back what the graph never deletes; it must outlive every object of the run, so it
+  // comes first and the program last.
+  ssaopt::PoolMemController m_Pool;
+  ssaopt::PoolMemController::Scope m_PoolScope{&m_Pool};
+  KvCSSAControl m_Control;
+  std::optional<Verification> m_Verification;
+  std::unique_ptr<client::Program> m_pProgram;
+  std::vector<std::pair<std::string, double>> m_Times;
+  std::size_t m_DefinitionsRemoved = 0;
+};
+
+}  // namespace
+
+int runTool(const Options& options, std::ostream& out, std::ostream& err) {
+  return Run(options, out, err).execute();
+}
+
+}  // namespace ssaopt::tool

@@ -1,0 +1,196 @@
+#include "options.h"
+
+#include <cerrno>
+#include <cstdlib>
+#include <iomanip>
+#include <sstream>
+
+#include "passes.h"
+
+namespace ssaopt::tool {
+
+namespace {
+
+std::vector<std::string> splitAtCommas(const std::string& list) {
+  std::vector<std::string> items;
+  std::istringstream in(list);
+  for (std::string item; std::getline(in, item, ',');)
+    if (!item.empty()) items.push_back(item);
+  return items;
+}
+
+bool startsWith(const std::string& text, const std::string& prefix) {
+  return text.compare(0, prefix.size(), prefix) == 0;
+}
+
+// Sets the flag an option without value names; false for any other argument.
+bool parseFlag(const std::string& argument, Options& options) {
+  struct Flag {
+    const char* name;
+    bool Options::*field;
+  };
+  static const Flag kFlags[] = {
+      {"--print-after-all", &Options::printAfterAll},
+      {"--verify", &Options::verify},
+      {"--stats", &Options::stats},
+      {"--time-passes", &Options::timePasses},
+      {"--show-values", &Options::showValues},
+      {"--help", &Options::help},
+      {"-h", &Options::help},
+      {"--version", &Options::version},
+  };
+  for (const Flag& flag : kFlags)
+    if (argument == flag.name) {
+      options.*flag.field = true;
+      return true;
+    }
+  return false;
+}
+
+// The value of "NAME VALUE" or "NAME=VALUE" at argument i, moving i past it; empty for any other
+// argument.
+std::optional<std::string> optionValue(const std::vector<std::string>& arguments, std::size_t& i,
+                                       const std::string& name, std::string& error) {
+  const std::string& argument = arguments[i];
+  if (startsWith(argument, name + "=")) return argument.substr(name.size() + 1);
+  if (argument != name) return std::nullopt;
+  if (i + 1 == arguments.size()) {
+    error = name + " needs a value";
+    return "";
+  }
+  return arguments[++i];
+}
+
+bool parseCount(const std::string& text, std::uint64_t& count) {
+  if (text.empty() || text.find_first_not_of("0123456789") != std::string::npos) return false;
+  errno = 0;
+  count = std::strtoull(text.c_str(), nullptr, 10);
+  return errno == 0;
+}
+
+// The options of run and check; false for any other argument.
+bool parseBehaviourOption(const std::vector<std::string>& arguments, std::size_t& i, Options& options,
+                          std::string& error) {
+  struct Count {
+    const char* name;
+    std::optional<std::uint64_t> Options::*field;
+  };
+  static const Count kCounts[] = {
+      {"--steps", &Options::steps}, {"--runs", &Options::runs}, {"--seed", &Options::seed}};
+  for (const Count& count : kCounts) {
+    std::optional<std::string> value = optionValue(arguments, i, count.name, error);
+    if (!value) continue;
+    std::uint64_t number = 0;
+    if (error.empty() && !parseCount(*value, number))
+      error = std::string(count.name) + " needs a whole number, not '" + *value + "'";
+    options.*count.field = number;
+    return true;
+  }
+  options.inputsPath = optionValue(arguments, i, "--inputs", error);
+  return options.inputsPath.has_value();
+}
+
+// What run and check accept, and what only they accept.
+std::string checkCommandOptions(const Options& options) {
+  bool behaviourOptions = options.steps || options.runs || options.seed || options.inputsPath;
+  if (options.command == Command::Transform && behaviourOptions)
+    return "--steps, --runs, --seed and --inputs belong to the run and check commands";
+  if (options.command == Command::Run && options.runs) return "--runs belongs to the check command";
+  if (options.command == Command::Check && options.inputsPath) return "--inputs belongs to the run command";
+  if (options.steps == 0u || options.runs == 0u) return "--steps and --runs need at least 1";
+  return "";
+}
+
+// Parses one argument, taking the next one too for "-o FILE"; returns an error or "".
+std::string parseArgument(const std::vector<std::string>& arguments, std::size_t& i, Options& options) {
+  const std::string& argument = arguments[i];
+  if (parseFlag(argument, options)) return "";
+  std::string error;
+  if (parseBehaviourOption(arguments, i, options, error)) return error;
+  if (startsWith(argument, "--passes=")) {
+    options.passes = splitAtCommas(argument.substr(9));
+  } else if (argument == "--emit=text") {
+    options.emit = Emit::Text;
+  } else if (argument == "--emit=dot") {
+    options.emit = Emit::Dot;
+  } else if (startsWith(argument, "--emit=")) {
+    return "unknown output format '" + argument.substr(7) + "'; use --emit=text or --emit=dot";
+  } else if (argument == "-o") {
+    if (++i == arguments.size()) return "-o needs a file name";
+    options.outputPath = arguments[i];
+  } else if (startsWith(argument, "-") && argument != "-") {
+    return "unknown option '" + argument + "'";
+  } else if (!options.inputPath.empty()) {
+    return "only one input file can be given";
+  } else {
+    options.inputPath = argument;
+  }
+  return "";
+}
+
+}  // namespace
+
+ParsedOptions parseOptions(const std::vector<std::string>& arguments) {
+  ParsedOptions parsed;
+  std::size_t first = 0;
+  if (!arguments.empty() && (arguments[0] == "run" || arguments[0] == "check")) {
+    parsed.options.command = arguments[0] == "run" ? Command::Run : Command::Check;
+    first = 1;
+  }
+  for (std::size_t i = first; i < arguments.size() && parsed.error.empty(); ++i)
+    parsed.error = parseArgument(arguments, i, parsed.options);
+  const Options& options = parsed.options;
+  if (parsed.error.empty()) parsed.error = checkCommandOptions(options);
+  if (parsed.error.empty() && !options.help && !options.version && options.inputPath.empty())
+    parsed.error = "no input file";
+  return parsed;
+}
+
+std::string usageText() {
+  std::ostringstream text;
+  text << "usage: ssaopt [options] FILE\n"
+          "       ssaopt run FILE [--passes=LIST] [--steps N] [--seed S] [--inputs VALUES]\n"
+          "       ssaopt check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S]\n"
+          "\n"
+          "Reads a program in the textual format, runs a pipeline of transformations on its\n"
+          "control-flow graph and writes the result.\n"
+          "\n"
+          "run prints the trace of one run of the program as written (or after --passes=LIST):\n"
+          "every external call with the values it uses, then the output variables. check runs\n"
+          "the program before and after the pipeline on R seeded input streams and reports the\n"
+          "first difference; it exits with 1 when there is one.\n"
+          "  --steps N          passes of #main per run (default "
+       << kDefaultSteps
+       << ")\n"
+          "  --seed S           seed of the input streams; check's run r uses S + r (default "
+       << kDefaultSeed
+       << ")\n"
+          "  --runs R           runs of check (default "
+       << kDefaultRuns
+       << ")\n"
+          "  --inputs VALUES    run on the values in file VALUES, a line NAME V1 V2 ... per\n"
+          "                     volatile variable, instead of seeded streams\n"
+          "\n"
+          "options:\n"
+          "  --passes=LIST      run these passes in order (comma-separated) instead of the\n"
+          "                     default pipeline below; --passes= runs none\n"
+          "  --print-after-all  print the program to standard error after every pass\n"
+          "  --emit=text|dot    write the result as program text (default) or as Graphviz\n"
+          "  -o FILE            write the result to FILE instead of standard output\n"
+          "  --show-values      in text output, show propagated values, ranges and executable edges\n"
+          "  --verify           check the graph after every pass with internal checks on; report\n"
+          "                     every internal error and consistency failure and exit with 1\n"
+          "  --stats            count procedures, blocks, statements and phi functions before\n"
+          "                     and after, constants found and definitions removed\n"
+          "  --time-passes      report the time each pass took\n"
+          "  --help, -h         show this text\n"
+          "  --version          show the version\n"
+          "\n"
+          "passes:\n";
+  for (const Pass& pass : passRegistry())
+    text << "  " << std::left << std::setw(20) << pass.name << " " << pass.summary << "\n";
+  text << "\ndefault pipeline (the typical run):\n  " << joinedPassNames(defaultPipeline()) << "\n";
+  return text.str();
+}
+
+}  // namespace ssaopt::tool

@@ -1,0 +1,52 @@
+// The command line of the ssaopt tool.
+#pragma once
+
+#include <cstdint>
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace ssaopt::tool {
+
+enum class Emit { Text, Dot };
+
+// What the tool does with the program: transform and write it, run it and print its trace
+// ("ssaopt run"), or run it before and after the pipeline and compare ("ssaopt check").
+enum class Command { Transform, Run, Check };
+
+// Of run and check, where not given.
+inline constexpr std::uint64_t kDefaultSteps = 10;
+inline constexpr std::uint64_t kDefaultRuns = 20;
+inline constexpr std::uint64_t kDefaultSeed = 1;
+
+struct Options {
+  Command command = Command::Transform;
+  std::string inputPath;
+  std::optional<std::vector<std::string>> passes;  // empty when not given: the default pipeline
+  bool printAfterAll = false;
+  Emit emit = Emit::Text;
+  std::string outputPath;  // empty: standard output
+  bool verify = false;
+  bool stats = false;
+  bool timePasses = false;
+  bool showValues = false;
+  bool help = false;
+  bool version = false;
+  // Of run and check: passes of "#main" per run, runs, the seed (of the first run), and a file of
+  // input values to run on instead of seeded streams.
+  std::optional<std::uint64_t> steps;
+  std::optional<std::uint64_t> runs;
+  std::optional<std::uint64_t> seed;
+  std::optional<std::string> inputsPath;
+};
+
+struct ParsedOptions {
+  Options options;
+  std::string error;  // non-empty when the command line is wrong
+};
+
+ParsedOptions parseOptions(const std::vector<std::string>& arguments);
+
+std::string usageText();
+
+}  // namespace ssaopt::tool
