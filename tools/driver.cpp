@@ -77,8 +77,7 @@ public:
     for (const std::string& name : pipeline) runPass(*findPass(name));
     writeNotices();
     bool written = writeResult();
-    if (m_Options.stats)
-      writeStatistics(m_Err, before, countGraph(m_pProgram->graph()), m_DefinitionsRemoved);
+    if (m_Options.stats) writeStatistics(m_Err, before, countGraph(m_pProgram->graph()), m_Removed);
     if (m_Options.timePasses) writeTimes();
     bool verified = !m_Verification || m_Verification->writeReports(m_Err);
     m_Control.shutdown();
@@ -101,14 +100,11 @@ private:
   }
 
   void runPass(const Pass& pass) {
-    std::size_t definitions = m_Options.stats ? countGraph(m_pProgram->graph()).definitions : 0;
+    GraphCounts ahead = m_Options.stats ? countGraph(m_pProgram->graph()) : GraphCounts();
     Clock::time_point start = Clock::now();
     pass.run(*m_pProgram);
     m_Times.emplace_back(pass.name, std::chrono::duration<double, std::milli>(Clock::now() - start).count());
-    if (m_Options.stats) {
-      std::size_t left = countGraph(m_pProgram->graph()).definitions;
-      if (left < definitions) m_DefinitionsRemoved += definitions - left;
-    }
+    if (m_Options.stats) m_Removed.add(ahead, countGraph(m_pProgram->graph()));
     if (m_Options.printAfterAll)
       m_Err << "// ---- after " << pass.name << " ----\n" << client::printProgram(*m_pProgram);
     if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), std::string("pass ") + pass.name);
@@ -159,7 +155,7 @@ private:
   std::optional<Verification> m_Verification;
   std::unique_ptr<client::Program> m_pProgram;
   std::vector<std::pair<std::string, double>> m_Times;
-  std::size_t m_DefinitionsRemoved = 0;
+  RemovedCounts m_Removed;
 };
 
 }  // namespace

@@ -40,7 +40,7 @@ GraphCounts countGraph(const KvCControlFlowGraph& graph) {
 }
 
 void writeStatistics(std::ostream& out, const GraphCounts& before, const GraphCounts& after,
-                     std::size_t definitionsRemoved) {
+                     const RemovedCounts& removed) {
   out << "statistics" << std::string(14, ' ') << std::setw(10) << "before" << std::setw(10) << "after"
       << "\n";
   writeRow(out, "procedures", before.procedures, after.procedures);
@@ -48,7 +48,8 @@ void writeStatistics(std::ostream& out, const GraphCounts& before, const GraphCo
   writeRow(out, "statements", before.statements, after.statements);
   writeRow(out, "phi functions", before.phiFunctions, after.phiFunctions);
   writeRow(out, "constants found", before.constants, after.constants);
-  writeRow(out, "definitions removed", 0, definitionsRemoved);
+  writeRow(out, "blocks removed", 0, removed.blocks);
+  writeRow(out, "definitions removed", 0, removed.definitions);
 }
 
 }  // namespace ssaopt::tool

@@ -20,8 +20,20 @@ struct GraphCounts {
 
 GraphCounts countGraph(const KvCControlFlowGraph& graph);
 
-// Before and after the pipeline, with the definitions that passes removed along the way.
+// What the passes removed along the way: a pass that leaves fewer blocks or definitions than it
+// found removed the difference (dividing blocks adds blocks, so totals alone would hide removals).
+struct RemovedCounts {
+  std::size_t blocks = 0;
+  std::size_t definitions = 0;
+
+  void add(const GraphCounts& ahead, const GraphCounts& behind) {
+    if (behind.blocks < ahead.blocks) blocks += ahead.blocks - behind.blocks;
+    if (behind.definitions < ahead.definitions) definitions += ahead.definitions - behind.definitions;
+  }
+};
+
+// Before and after the pipeline, with what the passes removed along the way.
 void writeStatistics(std::ostream& out, const GraphCounts& before, const GraphCounts& after,
-                     std::size_t definitionsRemoved);
+                     const RemovedCounts& removed);
 
 }  // namespace ssaopt::tool

@@ -198,7 +198,13 @@ TEST(ToolChecks, StatsCountBeforeAndAfterThePipeline) {
             "  statements                     5         5\n"
             "  phi functions                  0         0\n"
             "  constants found                0         0\n"
+            "  blocks removed                 0         0\n"
             "  definitions removed            0         0\n");
+  // The typical run removes the false branch and the definitions nobody reads.
+  ToolRun typical = runTool("--stats " + example("typical_run"));
+  EXPECT_EQ(typical.status, 0);
+  EXPECT_FALSE(contains(typical.err, "blocks removed                 0         0")) << typical.err;
+  EXPECT_FALSE(contains(typical.err, "definitions removed            0         0")) << typical.err;
 }
 
 TEST(ToolChecks, TimePassesReportsEachPassAndTheTotal) {
