@@ -13,7 +13,8 @@ struct DfsFrame {
   edge next;
 };
 
-void numberComponentOf(const graph& G, node start, int number, node_array<int>& compnum, array<node>& work) {
+void numberComponentOf(const graph& G, node start, int number, node_array<int>& compnum, array<node>& work,
+                       const std::function<bool(edge)>& follow) {
   compnum[start] = number;
   work.assign(1, start);
   while (!work.empty()) {
@@ -24,19 +25,25 @@ void numberComponentOf(const graph& G, node start, int number, node_array<int>& 
       compnum[w] = number;
       work.push_back(w);
     };
-    for (edge e : G.out(v)) visit(G.target(e));
-    for (edge e : G.in(v)) visit(G.source(e));
+    for (edge e : G.out(v))
+      if (follow(e)) visit(G.target(e));
+    for (edge e : G.in(v))
+      if (follow(e)) visit(G.source(e));
   }
 }
 
 }  // namespace
 
 int COMPONENTS(const graph& G, node_array<int>& compnum) {
+  return COMPONENTS(G, compnum, [](edge) { return true; });
+}
+
+int COMPONENTS(const graph& G, node_array<int>& compnum, const std::function<bool(edge)>& follow) {
   compnum.init(G, -1);
   array<node> work;
   int count = 0;
   for (node v : G.nodes())
-    if (compnum[v] == -1) numberComponentOf(G, v, count++, compnum, work);
+    if (compnum[v] == -1) numberComponentOf(G, v, count++, compnum, work, follow);
   return count;
 }
 

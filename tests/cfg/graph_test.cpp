@@ -265,6 +265,12 @@ TEST_F(Consistency, AComponentCountOtherThanTheProcedureCountIsFalseWithoutRepor
   plain(first, stray);
   EXPECT_TRUE(G.checkConsistency());
   EXPECT_TRUE(log.empty());
+
+  // An SSA edge from one procedure into another (a definition read by a parameter statement) is
+  // not control flow and joins no components.
+  G.new_edge(pMain->getEntryNode(), first, new KvCSSAEdge());
+  EXPECT_TRUE(G.checkConsistency());
+  EXPECT_TRUE(log.empty());
 }
 
 TEST_F(Consistency, ReportsEachNodeThatBreaksItsProcedureWhileInternalInfoIsShown) {

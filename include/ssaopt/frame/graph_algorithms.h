@@ -2,6 +2,8 @@
 // the graph, so generated programs with a million nodes in a chain are no problem.
 #pragma once
 
+#include <functional>
+
 #include "ssaopt/frame/graph.h"
 
 namespace ssaopt {
@@ -9,6 +11,8 @@ namespace ssaopt {
 // Connected components with edge directions ignored. compnum[v] is 0..k-1, numbered in the order in
 // which the node order (creation order) first meets the components. Returns k.
 int COMPONENTS(const graph& G, node_array<int>& compnum);
+// The same with only the edges that `follow` accepts; the others count as absent.
+int COMPONENTS(const graph& G, node_array<int>& compnum, const std::function<bool(edge)>& follow);
 
 // Strongly connected components, compnum[v] in 0..k-1. Numbering: depth-first searches start from the
 // nodes in creation order and follow out-edges in adjacency order; a component is numbered when its
