@@ -62,7 +62,9 @@ void assignTestedVariable(KvCCfgVariable* x, bool negated, KvCCfgAssignment*& tr
 }
 
 // A logical variable compared with a constant in the Boolean range is that constant on one branch
-// and its negation on the other; compared with any other constant, the outcome is fixed. Any other
+// and its negation on the other; compared with any other constant, the outcome is fixed, and the
+// condition becomes that outcome unless evaluating it has side effects (a volatile input read there
+// must stay, or every later read would see another value). Any other
 // variable is known only where it equals the constant. A floating-point variable that compares
 // equal to 0 may hold -0.0, which behaves differently (1.0 / x), so it is not said to hold +0.0.
 void assignComparedVariable(KvCCfgExpression& cond, KvCCfgVariable* x, const KvCCfgValue& c, bool inequality,
@@ -70,7 +72,7 @@ void assignComparedVariable(KvCCfgExpression& cond, KvCCfgVariable* x, const KvC
   if (isLogical(*x)) {
     if (!isInBooleanRange(c)) {
       cond.actOnComparisonOutsideBoolRange();
-      cond.replaceConditionWithConstant(inequality ? 1.0 : 0.0);
+      if (!cond.hasSideEffects()) cond.replaceConditionWithConstant(inequality ? 1.0 : 0.0);
       return;
     }
     const KvCCfgValue negation = !c;

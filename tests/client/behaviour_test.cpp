@@ -280,18 +280,34 @@ TEST(Behaviour, VirtualAssignmentsRunAsNothing) {
 // The parameter statement of an unused formal was removed although its argument reads a volatile
 // input: the program then read one input fewer per call, and later reads saw other values.
 TEST(Behaviour, RegressionAParameterWhoseArgumentReadsAnInputStays) {
-  EXPECT_TRUE(behaviourtest::sameBehaviour("var int16 v volatile;\n"
-                                           "var int16 p erasable = 0;\n"
-                                           "var int16 x = 0;\n"
-                                           "proc #main {\n"
-                                           "  call f(v);\n"
-                                           "  call f(v);\n"
-                                           "  x = v;\n"
-                                           "  extern show uses(x);\n"
-                                           "}\n"
-                                           "proc f(p) {\n"
-                                           "}\n",
-                                           {"ssa", "divide", "remove-unused"}));
+  EXPECT_TRUE(
+      behaviourtest::sameBehaviour("var int16 v volatile;\n"
+                                   "var int16 p erasable = 0;\n"
+                                   "var int16 x = 0;\n"
+                                   "proc #main {\n"
+                                   "  call f(v);\n"
+                                   "  call f(v);\n"
+                                   "  x = v;\n"
+                                   "  extern show uses(x);\n"
+                                   "}\n"
+                                   "proc f(p) {\n"
+                                   "}\n",
+                                   {"ssa", "divide", "remove-unused"}));
+}
+
+// A volatile Boolean compared with a constant outside 0 and 1 has a fixed outcome, but replacing the
+// condition by it dropped the read of the input: every later read saw another value.
+TEST(Behaviour, RegressionAFixedComparisonOfAnInputKeepsItsRead) {
+  EXPECT_TRUE(
+      behaviourtest::sameBehaviour("var bool in0 volatile;\n"
+                                   "var bool seen output = 0;\n"
+                                   "proc #main {\n"
+                                   "  if in0 != 5 goto yes else no;\n"
+                                   "yes:\n"
+                                   "  seen = in0;\n"
+                                   "no:\n"
+                                   "}\n",
+                                   {"valid-conditions"}));
 }
 
 }  // namespace

@@ -122,7 +122,7 @@ TEST(ToolInput, WarningsDoNotStopTheRun) {
 // condition, and the tool says so at the condition.
 TEST(ToolInput, AComparisonThatCannotHoldIsAWarningAtTheCondition) {
   std::string path = writeFile("decided.ssa",
-                               "var bool b volatile;\nvar int16 x output;\n"
+                               "var bool b;\nvar int16 x output;\n"
                                "proc #main {\n  if b != 5 goto end else two;\ntwo:\n  x = 2;\n}\n");
   ToolRun run = runTool("--passes=valid-conditions " + path);
   EXPECT_EQ(run.status, 0);
