@@ -5,6 +5,7 @@
 
 #include "behaviour.h"
 #include "driver.h"
+#include "fuzz.h"
 #include "options.h"
 
 namespace {
@@ -28,7 +29,10 @@ int main(int argc, char** argv) {
     std::cout << "ssaopt " << SSAOPT_VERSION << "\n";
     return 0;
   }
-  if (parsed.options.command != ssaopt::tool::Command::Transform)
+  ssaopt::tool::Command command = parsed.options.command;
+  if (command == ssaopt::tool::Command::Generate || command == ssaopt::tool::Command::Fuzz)
+    return ssaopt::tool::runGeneratorCommand(parsed.options, std::cout, std::cerr);
+  if (command != ssaopt::tool::Command::Transform)
     return ssaopt::tool::runBehaviourCommand(parsed.options, std::cout, std::cerr);
   return ssaopt::tool::runTool(parsed.options, std::cout, std::cerr);
 }

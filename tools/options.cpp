@@ -4,8 +4,10 @@
 #include <cstdlib>
 #include <iomanip>
 #include <sstream>
+#include <utility>
 
 #include "passes.h"
+#include "ssaopt/client/generator.h"
 
 namespace ssaopt::tool {
 
@@ -17,6 +19,19 @@ std::vector<std::string> splitAtCommas(const std::string& list) {
   for (std::string item; std::getline(in, item, ',');)
     if (!item.empty()) items.push_back(item);
   return items;
+}
+
+bool isGeneratorCommand(Command command) { return command == Command::Generate || command == Command::Fuzz; }
+
+// The command a first argument names; Transform for any other argument.
+Command commandNamed(const std::string& argument) {
+  static const std::pair<const char*, Command> kCommands[] = {{"run", Command::Run},
+                                                              {"check", Command::Check},
+                                                              {"generate", Command::Generate},
+                                                              {"fuzz", Command::Fuzz}};
+  for (const auto& command : kCommands)
+    if (argument == command.first) return command.second;
+  return Command::Transform;
 }
 
 bool startsWith(const std::string& text, const std::string& prefix) {
@@ -75,8 +90,11 @@ bool parseBehaviourOption(const std::vector<std::string>& arguments, std::size_t
     const char* name;
     std::optional<std::uint64_t> Options::*field;
   };
-  static const Count kCounts[] = {
-      {"--steps", &Options::steps}, {"--runs", &Options::runs}, {"--seed", &Options::seed}};
+  static const Count kCounts[] = {{"--steps", &Options::steps},
+                                  {"--runs", &Options::runs},
+                                  {"--seed", &Options::seed},
+                                  {"--size", &Options::size},
+                                  {"--programs", &Options::programs}};
   for (const Count& count : kCounts) {
     std::optional<std::string> value = optionValue(arguments, i, count.name, error);
     if (!value) continue;
@@ -90,14 +108,22 @@ bool parseBehaviourOption(const std::vector<std::string>& arguments, std::size_t
   return options.inputsPath.has_value();
 }
 
-// What run and check accept, and what only they accept.
+// Each command's own options, and none of another's.
 std::string checkCommandOptions(const Options& options) {
-  bool behaviourOptions = options.steps || options.runs || options.seed || options.inputsPath;
-  if (options.command == Command::Transform && behaviourOptions)
+  bool behaviourOptions = options.steps || options.runs || options.inputsPath;
+  bool generatorOptions = options.size || options.programs;
+  bool generates = isGeneratorCommand(options.command);
+  if (options.command == Command::Transform && (behaviourOptions || options.seed))
     return "--steps, --runs, --seed and --inputs belong to the run and check commands";
   if (options.command == Command::Run && options.runs) return "--runs belongs to the check command";
   if (options.command == Command::Check && options.inputsPath) return "--inputs belongs to the run command";
+  if (generates && behaviourOptions)
+    return "--steps, --runs and --inputs belong to the run and check commands";
+  if (!generates && generatorOptions) return "--size and --programs belong to the generate and fuzz commands";
+  if (options.command == Command::Generate && options.programs)
+    return "--programs belongs to the fuzz command";
   if (options.steps == 0u || options.runs == 0u) return "--steps and --runs need at least 1";
+  if (options.programs == 0u) return "--programs needs at least 1";
   return "";
 }
 
@@ -133,16 +159,17 @@ std::string parseArgument(const std::vector<std::string>& arguments, std::size_t
 ParsedOptions parseOptions(const std::vector<std::string>& arguments) {
   ParsedOptions parsed;
   std::size_t first = 0;
-  if (!arguments.empty() && (arguments[0] == "run" || arguments[0] == "check")) {
-    parsed.options.command = arguments[0] == "run" ? Command::Run : Command::Check;
-    first = 1;
-  }
+  if (!arguments.empty()) parsed.options.command = commandNamed(arguments[0]);
+  if (parsed.options.command != Command::Transform) first = 1;
   for (std::size_t i = first; i < arguments.size() && parsed.error.empty(); ++i)
     parsed.error = parseArgument(arguments, i, parsed.options);
   const Options& options = parsed.options;
   if (parsed.error.empty()) parsed.error = checkCommandOptions(options);
-  if (parsed.error.empty() && !options.help && !options.version && options.inputPath.empty())
+  bool readsFile = !isGeneratorCommand(options.command);
+  if (parsed.error.empty() && !options.help && !options.version && readsFile && options.inputPath.empty())
     parsed.error = "no input file";
+  if (parsed.error.empty() && !readsFile && !options.inputPath.empty())
+    parsed.error = "generate and fuzz read no file";
   return parsed;
 }
 
@@ -151,6 +178,8 @@ std::string usageText() {
   text << "usage: ssaopt [options] FILE\n"
           "       ssaopt run FILE [--passes=LIST] [--steps N] [--seed S] [--inputs VALUES]\n"
           "       ssaopt check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S]\n"
+          "       ssaopt generate [--seed S] [--size N]\n"
+          "       ssaopt fuzz [--programs P] [--seed S] [--size N] [--passes=LIST]\n"
           "\n"
           "Reads a program in the textual format, runs a pipeline of transformations on its\n"
           "control-flow graph and writes the result.\n"
@@ -170,6 +199,17 @@ std::string usageText() {
        << ")\n"
           "  --inputs VALUES    run on the values in file VALUES, a line NAME V1 V2 ... per\n"
           "                     volatile variable, instead of seeded streams\n"
+          "\n"
+          "generate writes a random valid program; the same seed gives the same program. fuzz\n"
+          "checks P generated programs (seeds S, S + 1, ...): no internal report, a consistent\n"
+          "graph after every pass, and the same behaviour before and after the pipeline; it\n"
+          "prints the seed of every failing program and exits with 1 when there is one.\n"
+          "  --size N           statements per procedure, roughly (default "
+       << client::kDefaultProgramSize
+       << ")\n"
+          "  --programs P       programs fuzz checks (default "
+       << kDefaultPrograms
+       << ")\n"
           "\n"
           "options:\n"
           "  --passes=LIST      run these passes in order (comma-separated) instead of the\n"

@@ -11,13 +11,16 @@ namespace ssaopt::tool {
 enum class Emit { Text, Dot };
 
 // What the tool does with the program: transform and write it, run it and print its trace
-// ("ssaopt run"), or run it before and after the pipeline and compare ("ssaopt check").
-enum class Command { Transform, Run, Check };
+// ("ssaopt run"), run it before and after the pipeline and compare ("ssaopt check"), write a random
+// program ("ssaopt generate"), or check the pipeline on many random programs ("ssaopt fuzz").
+enum class Command { Transform, Run, Check, Generate, Fuzz };
 
 // Of run and check, where not given.
 inline constexpr std::uint64_t kDefaultSteps = 10;
 inline constexpr std::uint64_t kDefaultRuns = 20;
 inline constexpr std::uint64_t kDefaultSeed = 1;
+// Of fuzz, where not given.
+inline constexpr std::uint64_t kDefaultPrograms = 100;
 
 struct Options {
   Command command = Command::Transform;
@@ -38,6 +41,9 @@ struct Options {
   std::optional<std::uint64_t> runs;
   std::optional<std::uint64_t> seed;
   std::optional<std::string> inputsPath;
+  // Of generate and fuzz: the size of each program, and how many programs fuzz checks.
+  std::optional<std::uint64_t> size;
+  std::optional<std::uint64_t> programs;
 };
 
 struct ParsedOptions {

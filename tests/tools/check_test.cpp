@@ -1,50 +1,20 @@
 // The run and check commands of the ssaopt tool as a user runs them: what they print, where, and
 // their exit status.
 #include <gtest/gtest.h>
-#include <sys/wait.h>
 
-#include <cstdlib>
-#include <fstream>
-#include <sstream>
 #include <string>
+
+#include "tools/tool_running.h"
 
 namespace {
 
 const char* const kExamples[] = {"typical_run", "controller", "procedures", "loop", "outline"};
 
-struct Result {
-  int status;
-  std::string out;
-  std::string err;
-};
-
-// A path of the running test's own, so that tests may run in parallel.
-std::string pathOf(const std::string& name) {
-  const ::testing::TestInfo* pTest = ::testing::UnitTest::GetInstance()->current_test_info();
-  return ::testing::TempDir() + "ssaopt_check_" + pTest->name() + "_" + name;
-}
-
-std::string contentsOf(const std::string& path) {
-  std::ifstream file(path);
-  std::ostringstream text;
-  text << file.rdbuf();
-  return text.str();
-}
-
-std::string fileWith(const std::string& name, const std::string& text) {
-  std::ofstream(pathOf(name)) << text;
-  return pathOf(name);
-}
-
-Result ssaopt(const std::string& arguments) {
-  std::string command =
-      std::string(SSAOPT_TOOL) + " " + arguments + " >'" + pathOf("out") + "' 2>'" + pathOf("err") + "'";
-  int status = std::system(command.c_str());
-  return Result{WIFEXITED(status) ? WEXITSTATUS(status) : -1, contentsOf(pathOf("out")),
-                contentsOf(pathOf("err"))};
-}
-
-std::string example(const char* name) { return std::string(SSAOPT_EXAMPLES_DIR) + "/" + name + ".ssa"; }
+using tooltest::example;
+using tooltest::fileWith;
+using tooltest::pathOf;
+using tooltest::Result;
+using tooltest::ssaopt;
 
 // The trace without its last line, which counts the statements the run executed.
 std::string eventsOf(const std::string& trace) {
