@@ -208,21 +208,21 @@ void KvCControlFlowGraph::visitInstruction(KvCBasicBlock* pBasicBlock, node v, l
 
 void KvCControlFlowGraph::visitAssignment(KvCCfgAssignment* pAssignment, node v, list<edge>& cfgWorkList,
                                           list<edge>& ssaWorkList, bool& changed) {
-  visitDefinition(pAssignment->getLHS(), *pAssignment->getRHS(), v, cfgWorkList, ssaWorkList, changed);
+  visitDefinition(pAssignment->getLHS(), *pAssignment->getRHS(), v, cfgWorkList, ssaWorkList, changed, true);
 }
 
 // The statement combines the arguments of all calls of its procedure.
 void KvCControlFlowGraph::visitParamStatement(KvCCfgParamStatement* pStatement, node v,
                                               list<edge>& cfgWorkList, list<edge>& ssaWorkList,
                                               bool& changed) {
-  visitDefinition(pStatement->getVariable(), *pStatement, v, cfgWorkList, ssaWorkList, changed);
+  visitDefinition(pStatement->getVariable(), *pStatement, v, cfgWorkList, ssaWorkList, changed, true);
 }
 
 void KvCControlFlowGraph::visitValueReturnStatement(KvCCfgValueReturnStatement* pStatement, node v,
                                                     list<edge>& cfgWorkList, list<edge>& ssaWorkList,
                                                     bool& changed) {
   visitDefinition(pStatement->getVariable(), *pStatement->getExpression(), v, cfgWorkList, ssaWorkList,
-                  changed);
+                  changed, false);
 }
 
 // The variable's previous value object is the caller's once the new one is stored: it is compared
@@ -230,10 +230,14 @@ void KvCControlFlowGraph::visitValueReturnStatement(KvCCfgValueReturnStatement* 
 // another pass; any change wakes the uses.
 template <class Definition>
 void KvCControlFlowGraph::visitDefinition(KvCCfgVariable* pVariable, const Definition& definition, node v,
-                                          list<edge>& cfgWorkList, list<edge>& ssaWorkList, bool& changed) {
+                                          list<edge>& cfgWorkList, list<edge>& ssaWorkList, bool& changed,
+                                          bool stores) {
   KvCCfgValue* pOld = pVariable->getValue();
   KvCCfgValue value = definition.evaluate();
-  pVariable->setVarValueAndAdjustCfgValue(value);
+  if (stores)
+    pVariable->setVarValueAndAdjustCfgValue(value);
+  else
+    pVariable->setVarValue(value);
   recordRange(pVariable, definition);
   if (pOld->compare(value) != 0) {
     if (pOld->isUndetermined() && value.isConstant()) changed = true;
@@ -273,7 +277,8 @@ void KvCControlFlowGraph::visitBranchCondition(KvCCfgExpression* pCond, node v, 
 // still undetermined leaves the meet alone. Nothing is scheduled: the uses are reached by the flow
 // step or in the next pass. Unlike an assignment, any change to a constant asks for another pass.
 // A join of thousands of edges is merged again on every one of them that becomes executable, so the
-// merge reuses one list for the values and the two bounds.
+// merge reuses one list for the values and the two bounds. The operands hold values their
+// definitions already adjusted to the variable, so the meet is stored as it is.
 void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node /*v*/, bool& changed) {
   KvCCfgVariable* pVariable = pPhi->getVariable();
   KvCCfgValue* pOld = pVariable->getValue();
@@ -281,7 +286,7 @@ void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node /*v*/, boo
   list<KvCCfgValue*> merged(operands.size());
   fillWith(merged, operands, [](KvCCfgVariable* pOperand) { return pOperand->getValue(); });
   KvCCfgValue value = intersect(merged);
-  pVariable->setVarValueAndAdjustCfgValue(value);
+  pVariable->setVarValue(value);
   if (!pOld->isConstant() && value.isConstant()) changed = true;
   fillWith(merged, operands,
            [](KvCCfgVariable* pOperand) { return boundOf(pOperand->getMinValue(), *pOperand); });

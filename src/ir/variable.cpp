@@ -55,6 +55,11 @@ void KvCCfgVariable::setVarValueAndAdjustCfgValue(KvCCfgValue& value) {
   m_pValue = value.clone();
 }
 
+void KvCCfgVariable::setVarValue(KvCCfgValue& value) {
+  if (isNeverConstant()) value.setValueKind(eCfgNonConstant);
+  m_pValue = value.clone();
+}
+
 // A saturated constant keeps the limit exactly: the limit is already a value of the variable, and
 // rounding it could move it past the border again.
 void KvCCfgVariable::fitConstant(KvCCfgValue& value) const {

@@ -310,4 +310,45 @@ TEST(Behaviour, RegressionAFixedComparisonOfAnInputKeepsItsRead) {
                                    {"valid-conditions"}));
 }
 
+// Storing -1 in an unsigned variable saturated at 20 leaves 4294967295 (the clamp comes before the
+// cast); the phi function joining two such stores adjusted the value again and clamped it to 20.
+TEST(Behaviour, RegressionAPhiFunctionDoesNotSaturateWhatItsOperandsHold) {
+  EXPECT_TRUE(
+      behaviourtest::sameBehaviour("var bool one = 0;\n"
+                                   "var bool in0 volatile;\n"
+                                   "var uint32 u saturate(..20) = 0;\n"
+                                   "var float32 y output = 0;\n"
+                                   "proc #main {\n"
+                                   "  one = 1;\n"
+                                   "  if in0 goto a else b;\n"
+                                   "a:\n"
+                                   "  u = -one;\n"
+                                   "  goto j;\n"
+                                   "b:\n"
+                                   "  u = -one;\n"
+                                   "j:\n"
+                                   "  y = u;\n"
+                                   "}\n",
+                                   {"ssa", "divide", "sccp", "replace-constants"}));
+}
+
+// The same through a value-return statement: what a procedure stored comes back to its caller as it
+// was, not saturated again.
+TEST(Behaviour, RegressionAReturnedValueIsNotSaturatedAgain) {
+  EXPECT_TRUE(
+      behaviourtest::sameBehaviour("var bool one = 0;\n"
+                                   "var uint32 u saturate(..20) = 0;\n"
+                                   "var float32 y output = 0;\n"
+                                   "proc #main {\n"
+                                   "  call set();\n"
+                                   "  call set();\n"
+                                   "  y = u;\n"
+                                   "}\n"
+                                   "proc set {\n"
+                                   "  one = 1;\n"
+                                   "  u = -one;\n"
+                                   "}\n",
+                                   {"ssa", "divide", "sccp", "replace-constants"}));
+}
+
 }  // namespace

@@ -348,11 +348,13 @@ private:
                                  ssaopt::list<ssaopt::edge>& cfgWorkList,
                                  ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
   // The visit shared by assignments, parameter and value-return statements: `definition` gives the
-  // new value, minimum and maximum of `pVariable`.
+  // new value, minimum and maximum of `pVariable`. `stores` is false where no store happens (a
+  // value-return statement takes back a value the variable already holds), so the value is not
+  // adjusted to the variable a second time.
   template <class Definition>
   void visitDefinition(KvCCfgVariable* pVariable, const Definition& definition, ssaopt::node v,
                        ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
-                       bool& changed);
+                       bool& changed, bool stores);
   template <class Definition>
   void recordRange(KvCCfgVariable* pVariable, const Definition& definition);
   void visitPhiFunction(KvCPhiFunction* pPhi, ssaopt::node v, bool& changed);

@@ -53,6 +53,12 @@ public:
   // Adjusts `value` in place to what the variable can hold and stores a copy as the current value.
   // The value object replaced is not deleted: a caller that fetched it with getValue() owns it now.
   void setVarValueAndAdjustCfgValue(KvCCfgValue& value);
+  // Makes `value`, a value that the variable already held (the meet of a phi function's operands),
+  // the current value without adjusting it again: saturating and casting are not idempotent (an
+  // unsigned variable saturated at 20 holds 4294967295 after storing -1, which a second adjustment
+  // would clamp to 20). Array and volatile variables still become non-constant. The replaced value
+  // object is the caller's, as with setVarValueAndAdjustCfgValue.
+  void setVarValue(KvCCfgValue& value);
   // Clamps the number of `value` (whatever its kind) to the saturated borders; true when it changed.
   bool ConsiderSaturation(KvCCfgValue& value) const;
   bool isScaled() const;
