@@ -46,17 +46,12 @@ KvCSSAVariable* KvCCfgVariable::isSSAVariable() { return nullptr; }
 // Array elements and volatile variables may change behind the analysis' back, so nothing about them
 // is constant; the caller sees that through its argument as well.
 void KvCCfgVariable::setVarValueAndAdjustCfgValue(KvCCfgValue& value) {
-  if (isNeverConstant()) {
-    m_pValue = new KvCCfgValue(eCfgNonConstant);
-    value.setValueKind(eCfgNonConstant);
-    return;
-  }
-  fitConstant(value);
-  m_pValue = value.clone();
+  if (!isNeverConstant()) fitConstant(value);
+  setVarValue(value);
 }
 
 void KvCCfgVariable::setVarValue(KvCCfgValue& value) {
-  if (isNeverConstant()) value.setValueKind(eCfgNonConstant);
+  if (isNeverConstant()) value = KvCCfgValue(eCfgNonConstant);
   m_pValue = value.clone();
 }
 
