@@ -4,6 +4,7 @@
 #include <memory>
 #include <sstream>
 
+#include "exit_status.h"
 #include "passes.h"
 #include "ssaopt/client/front_end.h"
 #include "ssaopt/client/interpreter.h"
@@ -14,9 +15,6 @@ namespace ssaopt::tool {
 
 namespace {
 
-constexpr int kFailure = 1;
-constexpr int kUnknownPass = 2;
-
 class BehaviourCommand {
 public:
   BehaviourCommand(const Options& options, std::ostream& out, std::ostream& err)
@@ -26,11 +24,6 @@ public:
     // run shows the program as written unless told otherwise; check is about the pipeline.
     std::vector<std::string> pipeline = m_Options.passes.value_or(
         m_Options.command == Command::Run ? std::vector<std::string>() : defaultPipeline());
-    std::string unknown = findUnknownPass(pipeline);
-    if (!unknown.empty()) {
-      m_Err << "ssaopt: " << unknown << "\n";
-      return kUnknownPass;
-    }
     m_Control.boot();
     int status = m_Options.command == Command::Run ? run(pipeline) : check(pipeline);
     m_Control.shutdown();
@@ -45,7 +38,7 @@ private:
     client::RunLimits limits;
     limits.steps = m_Options.steps.value_or(kDefaultSteps);
     m_Out << client::formatTrace(client::Interpreter(*pProgram).run(limits, *pInputs));
-    return 0;
+    return kSuccess;
   }
 
   int check(const std::vector<std::string>& pipeline) {
@@ -58,18 +51,11 @@ private:
     settings.limits.steps = m_Options.steps.value_or(kDefaultSteps);
     client::CheckReport report = client::checkBehaviour(*pOriginal, *pTransformed, settings);
     m_Out << client::formatReport(report);
-    return report.difference ? kFailure : 0;
+    return report.difference ? kFailure : kSuccess;
   }
 
-  // The program after `pipeline`, or null after its errors were shown. The second load of a file
-  // that loaded once shows the same warnings again, so only one shows them.
-  std::unique_ptr<client::Program> load(const std::vector<std::string>& pipeline, bool showDiagnostics) {
-    client::LoadResult loaded = client::loadProgramFile(m_Options.inputPath);
-    for (const client::Diagnostic& diagnostic : loaded.diagnostics)
-      if (showDiagnostics || !loaded.program)
-        m_Err << client::formatDiagnostic(m_Options.inputPath, diagnostic) << "\n";
-    if (loaded.program) runPipeline(pipeline, *loaded.program);
-    return std::move(loaded.program);
+  std::unique_ptr<client::Program> load(const std::vector<std::string>& pipeline, bool showWarnings) {
+    return loadProgramAndRunPipeline(m_Options.inputPath, pipeline, showWarnings, m_Err);
   }
 
   std::unique_ptr<client::InputStreams> openInputs() {

@@ -6,7 +6,9 @@
 #include <memory>
 #include <optional>
 
+#include "exit_status.h"
 #include "passes.h"
+#include "ssaopt/client/c_emitter.h"
 #include "ssaopt/client/dot.h"
 #include "ssaopt/client/front_end.h"
 #include "ssaopt/client/printer.h"
@@ -19,9 +21,6 @@ namespace ssaopt::tool {
 
 namespace {
 
-constexpr int kFailure = 1;
-constexpr int kUnknownPass = 2;
-
 using Clock = std::chrono::steady_clock;
 
 class Run {
@@ -31,7 +30,6 @@ public:
 
   int execute() {
     std::vector<std::string> pipeline = m_Options.passes.value_or(defaultPipeline());
-    if (!checkPipeline(pipeline)) return kUnknownPass;
     m_Control.boot();
     if (m_Options.verify) m_Verification.emplace();
     if (!load()) return kFailure;
@@ -44,16 +42,10 @@ public:
     if (m_Options.timePasses) writeTimes();
     bool verified = !m_Verification || m_Verification->writeReports(m_Err);
     m_Control.shutdown();
-    return written && verified ? 0 : kFailure;
+    return written && verified ? kSuccess : kFailure;
   }
 
 private:
-  bool checkPipeline(const std::vector<std::string>& pipeline) {
-    std::string unknown = findUnknownPass(pipeline);
-    if (!unknown.empty()) m_Err << "ssaopt: " << unknown << "\n";
-    return unknown.empty();
-  }
-
   bool load() {
     client::LoadResult loaded = client::loadProgramFile(m_Options.inputPath);
     for (const client::Diagnostic& diagnostic : loaded.diagnostics)
@@ -82,8 +74,9 @@ private:
   }
 
   bool writeResult() {
-    std::string result = m_Options.emit == Emit::Dot
-                             ? client::writeDot(*m_pProgram)
+    std::string result = m_Options.emit == Emit::Dot ? client::writeDot(*m_pProgram)
+                         : m_Options.emit == Emit::C
+                             ? client::emitC(*m_pProgram).text
                              : client::printProgram(*m_pProgram, client::PrintOptions{m_Options.showValues});
     if (m_Options.outputPath.empty()) {
       m_Out << result;
@@ -105,6 +98,9 @@ private:
     }
     m_Err << "time " << std::left << std::setw(20) << "total" << std::right << std::setw(12) << total
           << " ms\n";
+    // What the library held at most, from reading the program to the end of the last pass.
+    m_Err << "peak memory " << std::left << std::setw(14) << "" << std::right << std::setw(12)
+          << std::setprecision(1) << static_cast<double>(m_Pool.peakBytes()) / 1024 << " KiB\n";
   }
 
   const Options& m_Options;

@@ -1,30 +1,67 @@
 #include "fuzz.h"
 
-#include <chrono>
-#include <iomanip>
-#include <memory>
-#include <sstream>
+#include <unistd.h>
 
+#include <chrono>
+#include <csignal>
+#include <cstdio>
+#include <fstream>
+#include <iomanip>
+#include <iterator>
+#include <vector>
+
+#include "exit_status.h"
 #include "passes.h"
-#include "ssaopt/client/front_end.h"
+#include "program_check.h"
+#include "shrink.h"
 #include "ssaopt/client/generator.h"
-#include "ssaopt/client/interpreter.h"
 #include "ssaopt/frame/control.h"
-#include "ssaopt/frame/pool.h"
-#include "verification.h"
 
 namespace ssaopt::tool {
 
 namespace {
 
-constexpr int kFailure = 1;
-constexpr int kUnknownPass = 2;
-// Input streams each program runs on before and after the pipeline: a few, so that a thousand
-// programs take seconds, while the many programs make up for the few streams.
-constexpr std::uint64_t kRunsPerProgram = 5;
-constexpr std::uint64_t kProgressInterval = 100;
+// A progress line at most this often, and one at the end.
+constexpr std::chrono::seconds kProgressInterval(1);
+// Every this many programs, another process optimises the program too and must print the same.
+constexpr std::uint64_t kDeterminismInterval = 10;
 
 using Clock = std::chrono::steady_clock;
+
+// ---- Crashes -------------------------------------------------------------------------------------
+
+// What to say if checking a program crashes the process: prepared before each program, because a
+// signal handler may only write what is already there.
+char g_CrashMessage[512];
+std::size_t g_CrashMessageLength = 0;
+
+constexpr int kCrashSignals[] = {SIGSEGV, SIGABRT, SIGFPE, SIGBUS, SIGILL};
+struct sigaction g_PreviousActions[std::size(kCrashSignals)];
+
+// Says which program crashed, then puts back the handler that was there before (a sanitizer's, or
+// the default) and returns: a fault happens again at once and reaches that handler with its own
+// details; abort() raises its signal again itself.
+extern "C" void reportCrash(int signal) {
+  ssize_t written = write(STDERR_FILENO, g_CrashMessage, g_CrashMessageLength);
+  (void)written;
+  for (std::size_t i = 0; i < std::size(kCrashSignals); ++i)
+    if (kCrashSignals[i] == signal) sigaction(signal, &g_PreviousActions[i], nullptr);
+}
+
+void installCrashReport() {
+  struct sigaction action {};
+  action.sa_handler = reportCrash;
+  sigemptyset(&action.sa_mask);
+  for (std::size_t i = 0; i < std::size(kCrashSignals); ++i)
+    sigaction(kCrashSignals[i], &action, &g_PreviousActions[i]);
+}
+
+// The executable of this process, which the determinism check runs again.
+std::string ownExecutable() {
+  std::vector<char> path(4096);
+  ssize_t length = readlink("/proc/self/exe", path.data(), path.size() - 1);
+  return length > 0 ? std::string(path.data(), static_cast<std::size_t>(length)) : "";
+}
 
 class GeneratorCommand {
 public:
@@ -34,80 +71,65 @@ public:
         m_Err(err),
         m_FirstSeed(options.seed.value_or(kDefaultSeed)),
         m_Size(options.size.value_or(client::kDefaultProgramSize)),
-        m_Pipeline(options.passes.value_or(defaultPipeline())) {}
+        m_Check(options.passes.value_or(defaultPipeline()), ownExecutable()) {}
 
   int execute() {
     if (m_Options.command == Command::Generate) {
       m_Out << client::generateProgram(m_FirstSeed, m_Size);
-      return 0;
-    }
-    std::string unknown = findUnknownPass(m_Pipeline);
-    if (!unknown.empty()) {
-      m_Err << "ssaopt: " << unknown << "\n";
-      return kUnknownPass;
+      return kSuccess;
     }
     m_Control.boot();
+    installCrashReport();
     fuzz();
     m_Control.shutdown();
-    return m_Failures ? kFailure : 0;
+    return m_Failures ? kFailure : kSuccess;
   }
 
 private:
   void fuzz() {
     std::uint64_t programs = m_Options.programs.value_or(kDefaultPrograms);
+    Clock::time_point lastProgress = m_Start;
     for (std::uint64_t done = 0; done < programs;) {
       checkProgram(m_FirstSeed + done);
-      if (++done % kProgressInterval == 0 || done == programs) writeProgress(done);
+      Clock::time_point now = Clock::now();
+      if (++done == programs || now - lastProgress >= kProgressInterval) {
+        writeProgress(done, now);
+        lastProgress = now;
+      }
     }
   }
 
   void checkProgram(std::uint64_t seed) {
-    std::string problem = findProblem(client::generateProgram(seed, m_Size));
-    if (problem.empty()) return;
+    prepareCrashMessage(seed);
+    std::string text = client::generateProgram(seed, m_Size);
+    bool checkDeterminism = seed % kDeterminismInterval == 0;
+    Problem problem = m_Check.findProblem(text, checkDeterminism);
+    if (!problem) return;
     ++m_Failures;
-    m_Err << "failure in the program of seed " << seed << ":\n" << problem;
-    m_Err << "  reproduce: ssaopt generate --seed " << seed << " --size " << m_Size
-          << " > f.ssa; ssaopt check f.ssa";
-    if (m_Options.passes) m_Err << " '--passes=" << commaSeparated(m_Pipeline) << "'";
-    m_Err << "\n";
+    m_Err << "failure in the program of seed " << seed << ":\n" << problem.detail;
+    std::string path = "fuzz-" + std::to_string(seed) + ".ssa";
+    writeProgram(path, text, problem.kind);
+    if (problem.kind == ProblemKind::Invalid) return;
+    std::string shrunk = shrinkProgram(text, [&](const std::string& candidate) {
+      return m_Check.findProblem(candidate, checkDeterminism).kind == problem.kind;
+    });
+    writeProgram("fuzz-" + std::to_string(seed) + "-shrunk.ssa", shrunk, problem.kind);
   }
 
-  static std::string commaSeparated(const std::vector<std::string>& names) {
-    std::string list;
-    for (const std::string& name : names) list += (list.empty() ? "" : ",") + name;
-    return list;
+  void writeProgram(const std::string& path, const std::string& text, ProblemKind kind) {
+    std::ofstream(path, std::ios::binary) << text;
+    m_Err << "  wrote " << path << "; reproduce: " << m_Check.reproduceCommand(kind, path) << "\n";
   }
 
-  // What went wrong with the program, one line or more; empty when nothing did.
-  std::string findProblem(const std::string& text) {
-    client::LoadResult original = client::loadProgram(text);
-    if (!original.program)
-      return client::formatDiagnostic("generated.ssa", original.diagnostics.back()) + "\n";
-    std::ostringstream reports;
-    std::unique_ptr<client::Program> pTransformed = transform(text, reports);
-    if (!reports.str().empty()) return reports.str();
-    client::CheckSettings settings;
-    settings.runs = kRunsPerProgram;
-    client::CheckReport report = client::checkBehaviour(*original.program, *pTransformed, settings);
-    return report.difference ? client::formatReport(report) : "";
+  void prepareCrashMessage(std::uint64_t seed) {
+    std::string message = "ssaopt: fuzz: crashed on the program of seed " + std::to_string(seed) +
+                          "; reproduce: ssaopt fuzz --programs 1 --seed " + std::to_string(seed) +
+                          " --size " + std::to_string(m_Size) + m_Check.passesOption() + "\n";
+    g_CrashMessageLength = message.copy(g_CrashMessage, sizeof g_CrashMessage);
   }
 
-  // The program after the pipeline, with the internal checks on and the graph checked after every
-  // pass; what they report goes to `reports`.
-  std::unique_ptr<client::Program> transform(const std::string& text, std::ostream& reports) {
-    Verification verification;
-    std::unique_ptr<client::Program> pProgram = client::loadProgram(text).program;
-    verification.checkGraph(pProgram->graph(), "the front end");
-    for (const std::string& name : m_Pipeline) {
-      runPipeline({name}, *pProgram);
-      verification.checkGraph(pProgram->graph(), "pass " + name);
-    }
-    verification.writeReports(reports);
-    return pProgram;
-  }
-
-  void writeProgress(std::uint64_t done) {
-    double seconds = std::chrono::duration<double>(Clock::now() - m_Start).count();
+  void writeProgress(std::uint64_t done, Clock::time_point now) {
+    double seconds = std::chrono::duration<double>(now - m_Start).count();
     m_Out << "fuzz: " << done << " programs, " << m_Failures << " failures, " << std::fixed
           << std::setprecision(1) << done / seconds << " programs/s" << std::endl;
   }
@@ -117,12 +139,9 @@ private:
   std::ostream& m_Err;
   std::uint64_t m_FirstSeed;
   std::uint64_t m_Size;
-  std::vector<std::string> m_Pipeline;
+  ProgramCheck m_Check;
   std::uint64_t m_Failures = 0;
   Clock::time_point m_Start = Clock::now();
-  // The pool takes back what the graph never deletes; every program lives inside findProblem().
-  ssaopt::PoolMemController m_Pool;
-  ssaopt::PoolMemController::Scope m_PoolScope{&m_Pool};
   KvCSSAControl m_Control;
 };
 

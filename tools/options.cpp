@@ -28,7 +28,8 @@ Command commandNamed(const std::string& argument) {
   static const std::pair<const char*, Command> kCommands[] = {{"run", Command::Run},
                                                               {"check", Command::Check},
                                                               {"generate", Command::Generate},
-                                                              {"fuzz", Command::Fuzz}};
+                                                              {"fuzz", Command::Fuzz},
+                                                              {"cc-check", Command::CcCheck}};
   for (const auto& command : kCommands)
     if (argument == command.first) return command.second;
   return Command::Transform;
@@ -104,8 +105,10 @@ bool parseBehaviourOption(const std::vector<std::string>& arguments, std::size_t
     options.*count.field = number;
     return true;
   }
-  options.inputsPath = optionValue(arguments, i, "--inputs", error);
-  return options.inputsPath.has_value();
+  std::optional<std::string> inputs = optionValue(arguments, i, "--inputs", error);
+  if (!inputs) return false;
+  options.inputsPath = inputs;
+  return true;
 }
 
 // Each command's own options, and none of another's.
@@ -116,7 +119,8 @@ std::string checkCommandOptions(const Options& options) {
   if (options.command == Command::Transform && (behaviourOptions || options.seed))
     return "--steps, --runs, --seed and --inputs belong to the run and check commands";
   if (options.command == Command::Run && options.runs) return "--runs belongs to the check command";
-  if (options.command == Command::Check && options.inputsPath) return "--inputs belongs to the run command";
+  if ((options.command == Command::Check || options.command == Command::CcCheck) && options.inputsPath)
+    return "--inputs belongs to the run command";
   if (generates && behaviourOptions)
     return "--steps, --runs and --inputs belong to the run and check commands";
   if (!generates && generatorOptions) return "--size and --programs belong to the generate and fuzz commands";
@@ -124,6 +128,7 @@ std::string checkCommandOptions(const Options& options) {
     return "--programs belongs to the fuzz command";
   if (options.steps == 0u || options.runs == 0u) return "--steps and --runs need at least 1";
   if (options.programs == 0u) return "--programs needs at least 1";
+  if (options.passes) return findPipelineError(*options.passes);
   return "";
 }
 
@@ -139,8 +144,10 @@ std::string parseArgument(const std::vector<std::string>& arguments, std::size_t
     options.emit = Emit::Text;
   } else if (argument == "--emit=dot") {
     options.emit = Emit::Dot;
+  } else if (argument == "--emit=c") {
+    options.emit = Emit::C;
   } else if (startsWith(argument, "--emit=")) {
-    return "unknown output format '" + argument.substr(7) + "'; use --emit=text or --emit=dot";
+    return "unknown output format '" + argument.substr(7) + "'; use --emit=text, --emit=dot or --emit=c";
   } else if (argument == "-o") {
     if (++i == arguments.size()) return "-o needs a file name";
     options.outputPath = arguments[i];
@@ -152,6 +159,15 @@ std::string parseArgument(const std::vector<std::string>& arguments, std::size_t
     options.inputPath = argument;
   }
   return "";
+}
+
+// " (after ssa, divide)", " (before ssa)" or " (once)" for a pass that can run only there.
+std::string whereThePassRuns(const Pass& pass) {
+  std::string after;
+  for (std::string_view need : pass.needs) after += (after.empty() ? "after " : ", ") + std::string(need);
+  if (!after.empty()) return " (" + after + ")";
+  if (!pass.beforeSSAOnly) return "";
+  return std::string_view(pass.name) == "ssa" ? " (once)" : " (before ssa)";
 }
 
 }  // namespace
@@ -178,6 +194,7 @@ std::string usageText() {
   text << "usage: ssaopt [options] FILE\n"
           "       ssaopt run FILE [--passes=LIST] [--steps N] [--seed S] [--inputs VALUES]\n"
           "       ssaopt check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S]\n"
+          "       ssaopt cc-check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S]\n"
           "       ssaopt generate [--seed S] [--size N]\n"
           "       ssaopt fuzz [--programs P] [--seed S] [--size N] [--passes=LIST]\n"
           "\n"
@@ -187,7 +204,9 @@ std::string usageText() {
           "run prints the trace of one run of the program as written (or after --passes=LIST):\n"
           "every external call with the values it uses, then the output variables. check runs\n"
           "the program before and after the pipeline on R seeded input streams and reports the\n"
-          "first difference; it exits with 1 when there is one.\n"
+          "first difference; it exits with 1 when there is one. cc-check compiles the C emitted\n"
+          "before and after the pipeline ($CC, else cc) and compares both with the interpreter\n"
+          "on the same R streams.\n"
           "  --steps N          passes of #main per run (default "
        << kDefaultSteps
        << ")\n"
@@ -202,8 +221,10 @@ std::string usageText() {
           "\n"
           "generate writes a random valid program; the same seed gives the same program. fuzz\n"
           "checks P generated programs (seeds S, S + 1, ...): no internal report, a consistent\n"
-          "graph after every pass, and the same behaviour before and after the pipeline; it\n"
-          "prints the seed of every failing program and exits with 1 when there is one.\n"
+          "graph after every pass, printed programs that read back, the same behaviour before\n"
+          "and after the pipeline, and (every tenth program) the same result from another\n"
+          "process. It writes each failing program to fuzz-SEED.ssa and a shrunk one to\n"
+          "fuzz-SEED-shrunk.ssa, with the command that shows the failure, and exits with 1.\n"
           "  --size N           statements per procedure, roughly (default "
        << client::kDefaultProgramSize
        << ")\n"
@@ -215,7 +236,7 @@ std::string usageText() {
           "  --passes=LIST      run these passes in order (comma-separated) instead of the\n"
           "                     default pipeline below; --passes= runs none\n"
           "  --print-after-all  print the program to standard error after every pass\n"
-          "  --emit=text|dot    write the result as program text (default) or as Graphviz\n"
+          "  --emit=text|dot|c  write the result as program text (default), as Graphviz or as C\n"
           "  -o FILE            write the result to FILE instead of standard output\n"
           "  --show-values      in text output, show propagated values, ranges and executable edges\n"
           "  --verify           check the graph after every pass with internal checks on; report\n"
@@ -228,8 +249,13 @@ std::string usageText() {
           "\n"
           "passes:\n";
   for (const Pass& pass : passRegistry())
-    text << "  " << std::left << std::setw(20) << pass.name << " " << pass.summary << "\n";
+    text << "  " << std::left << std::setw(20) << pass.name << " " << pass.summary << whereThePassRuns(pass)
+         << "\n";
   text << "\ndefault pipeline (the typical run):\n  " << joinedPassNames(defaultPipeline()) << "\n";
+  text << "\nexit status: 0 on success; 1 when the program has errors, a check or fuzz finds a\n"
+          "difference or failure, --verify reports, or the result cannot be written; 2 when the\n"
+          "command line is wrong (an unknown option or pass, a pass out of order, a bad number,\n"
+          "a missing or unreadable file), with one line on standard error.\n";
   return text.str();
 }
 

@@ -8,12 +8,13 @@
 
 namespace ssaopt::tool {
 
-enum class Emit { Text, Dot };
+enum class Emit { Text, Dot, C };
 
 // What the tool does with the program: transform and write it, run it and print its trace
 // ("ssaopt run"), run it before and after the pipeline and compare ("ssaopt check"), write a random
-// program ("ssaopt generate"), or check the pipeline on many random programs ("ssaopt fuzz").
-enum class Command { Transform, Run, Check, Generate, Fuzz };
+// program ("ssaopt generate"), check the pipeline on many random programs ("ssaopt fuzz"), or compile
+// the C emitted before and after the pipeline and compare it with the interpreter ("ssaopt cc-check").
+enum class Command { Transform, Run, Check, Generate, Fuzz, CcCheck };
 
 // Of run and check, where not given.
 inline constexpr std::uint64_t kDefaultSteps = 10;

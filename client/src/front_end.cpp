@@ -6,6 +6,7 @@
 
 #include "front_end_steps.h"
 #include "ssaopt/client/parser.h"
+#include "ssaopt/ir/procedure.h"
 
 namespace ssaopt::client {
 
@@ -48,6 +49,15 @@ LoadResult loadProgramFile(const std::string& path) {
   std::ostringstream text;
   text << file.rdbuf();
   return loadProgram(text.str());
+}
+
+void restartObjectNumbering() {
+  KvCBasicBlock::boot();
+  KvCCfgEdgeInfo::boot();
+  KvCCfgExpression::boot();
+  KvCCfgProcedure::boot();
+  KvCCfgStatement::boot();
+  KvCCfgVariable::boot();
 }
 
 }  // namespace ssaopt::client

@@ -1,8 +1,10 @@
 // Writes random programs that keep every rule the front end enforces: formals are variables of their
-// own that only their procedure reads, so no argument reads another formal of its callee; a
-// procedure calls only procedures declared after it, so there is no recursion; a loop's counter is
-// written by its loop alone and bounded by a constant, so every loop ends; a lone literal assigned or
-// passed to a variable is one it holds; external calls modify only volatile variables and arrays.
+// own that only their procedure reads, and no argument reads a formal of its callee; a call of a
+// procedure declared later is plain, while a call of the caller itself or of an earlier procedure
+// (recursion, direct or mutual) runs only while a shared depth counter is below a small bound, so
+// every chain of calls ends; a loop's counter is written by its loop alone and bounded by a
+// constant, so every loop ends; a lone literal assigned or passed to a variable is one it holds;
+// external calls modify only volatile variables and arrays.
 #include "ssaopt/client/generator.h"
 
 #include <algorithm>
@@ -71,8 +73,12 @@ constexpr int kMaxLoopDepth = 2;
 constexpr std::size_t kMaxIterations = 3;
 constexpr std::size_t kMaxProcedures = 4;
 constexpr std::size_t kMaxFormals = 2;
+// Recursive calls nested at most this deep.
+constexpr std::size_t kMaxRecursion = 2;
 
 enum class Role { Plain, Input, Array, Counter, Formal };
+
+constexpr std::size_t kNoProcedure = ~std::size_t(0);
 
 struct Variable {
   std::string name;
@@ -94,6 +100,7 @@ public:
   std::string generate() {
     declareGlobals();
     declareProcedures();
+    m_RecursionDepth = declare(Variable{"depth", &kCounterType, Role::Counter, 0}, " = 0");
     std::ostringstream procedures;
     for (m_Current = 0; m_Current < m_Procedures.size(); ++m_Current) writeProcedure(procedures);
     return m_Declarations.str() + procedures.str();
@@ -192,7 +199,8 @@ private:
     bool nests = depth < kMaxDepth;
     if (choice < 35) return writeAssignment(out);
     if (choice < 45) return writeElementWrite(out);
-    if (choice < 57 && m_Current + 1 < m_Procedures.size()) return writeCall(out);
+    if (choice < 55 && m_Current + 1 < m_Procedures.size()) return writeCall(laterProcedure(), out);
+    if (choice < 57 && m_Current > 0) return writeRecursiveCall(out);
     if (choice < 65) return writeExternCall(out);
     if (choice < 85 && nests) return writeIfElse(depth, out);
     if (choice < 93 && nests && m_LoopDepth < kMaxLoopDepth) return writeLoop(depth, out);
@@ -210,14 +218,31 @@ private:
     out << "  " << elementOf(pickVariable(Role::Array, nullptr)) << " = " << expression() << ";\n";
   }
 
-  void writeCall(std::ostream& out) {
-    std::size_t callee = m_Current + 1 + m_Random.below(m_Procedures.size() - m_Current - 1);
+  std::size_t laterProcedure() { return m_Current + 1 + m_Random.below(m_Procedures.size() - m_Current - 1); }
+
+  // The arguments never read the callee's formals, which the callee's own calls may be changing.
+  void writeCall(std::size_t callee, std::ostream& out) {
     out << "  call " << m_Procedures[callee].name << "(";
     const std::vector<std::size_t>& formals = m_Procedures[callee].formals;
+    m_Callee = callee;
     for (std::size_t i = 0; i < formals.size(); ++i)
       out << (i ? ", " : "")
           << (m_Random.chance(25) ? fittingLiteral(m_Variables[formals[i]]) : expression());
+    m_Callee = kNoProcedure;
     out << ");\n";
+  }
+
+  // A call of the current procedure or of an earlier one except #main, guarded by the depth counter.
+  void writeRecursiveCall(std::ostream& out) {
+    std::string label = std::to_string(m_Labels++);
+    const std::string& depth = m_Variables[m_RecursionDepth].name;
+    out << "  if " << depth << " < " << kMaxRecursion << " goto recurse" << label << " else skip" << label
+        << ";\n";
+    out << "recurse" << label << ":\n";
+    out << "  " << depth << " = " << depth << " + 1;\n";
+    writeCall(1 + m_Random.below(m_Current), out);
+    out << "  " << depth << " = " << depth << " - 1;\n";
+    out << "skip" << label << ":\n";
   }
 
   // An external function reads some variables and may change inputs and arrays only.
@@ -257,8 +282,11 @@ private:
     out << "  goto join" << label << ";\n";
     out << "no" << label << ":\n" << twin;
     writeStatements(m_Random.below(3), depth + 1, out);
-    out << "join" << label << ":\n";
+    out << outlineMark() << "join" << label << ":\n";
   }
+
+  // Sometimes the code from a join on becomes a procedure of its own.
+  std::string outlineMark() { return m_Random.chance(10) ? "outline " : ""; }
 
   void writeLoop(int depth, std::ostream& out) {
     std::string label = std::to_string(m_Labels++);
@@ -327,8 +355,12 @@ private:
     return readableScalar(nullptr);
   }
 
+  // The index is sometimes a variable, which may lie outside the array.
   std::string elementOf(std::size_t array) {
-    return m_Variables[array].name + "[" + std::to_string(m_Random.below(m_Variables[array].length)) + "]";
+    const Variable& variable = m_Variables[array];
+    std::string index =
+        m_Random.chance(25) ? readableScalar(nullptr) : std::to_string(m_Random.below(variable.length));
+    return variable.name + "[" + index + "]";
   }
 
   // A scalar the current procedure may read, of `pType` unless null: a global or one of its own
@@ -344,8 +376,12 @@ private:
     const Variable& variable = m_Variables[index];
     if (variable.role == Role::Array || (variable.role == Role::Input && !m_ReadsInputs)) return false;
     if (variable.role != Role::Formal) return true;
-    const std::vector<std::size_t>& own = m_Procedures[m_Current].formals;
-    return std::find(own.begin(), own.end(), index) != own.end();
+    return isFormalOf(m_Current, index) && (m_Callee == kNoProcedure || !isFormalOf(m_Callee, index));
+  }
+
+  bool isFormalOf(std::size_t procedure, std::size_t variable) const {
+    const std::vector<std::size_t>& formals = m_Procedures[procedure].formals;
+    return std::find(formals.begin(), formals.end(), variable) != formals.end();
   }
 
   std::size_t pickVariable(Role role, const DataType* pType) {
@@ -381,7 +417,9 @@ private:
   std::ostringstream m_Declarations;
   std::vector<Variable> m_Variables;
   std::vector<Procedure> m_Procedures;
-  std::size_t m_Current = 0;  // the procedure being written
+  std::size_t m_Current = 0;            // the procedure being written
+  std::size_t m_Callee = kNoProcedure;  // the procedure whose arguments are being written
+  std::size_t m_RecursionDepth = 0;     // the variable that counts nested recursive calls
   std::size_t m_Labels = 0;
   int m_LoopDepth = 0;
   bool m_ReadsInputs = true;

@@ -6,6 +6,7 @@
 #include <stdexcept>
 
 #include "interpreter_code.h"
+#include "program_view.h"
 #include "ssaopt/client/statements.h"
 #include "ssaopt/client/variable.h"
 #include "ssaopt/ir/procedure.h"
@@ -28,23 +29,6 @@ public:
 std::string variableName(KvCCfgVariable* pVariable) {
   KvCCfgSFVariable* pNamed = originalOf(pVariable)->isSFVariable();
   return pNamed ? "'" + pNamed->getName() + "'" : "a variable of no program";
-}
-
-// Whether the SSA transformation ran: it leaves phi functions, interface statements or versions.
-bool isInSSAForm(const KvCControlFlowGraph& graph) {
-  for (node v : graph.nodes()) {
-    KvCBasicBlock* pBlock = graph.getBasicBlock(v);
-    if (!pBlock) continue;
-    if (!pBlock->getPhiFunctions().empty()) return true;
-    for (KvCCfgStatement* pStatement : pBlock->getStatementSeq()) {
-      if (pStatement->isParamStatement() || pStatement->isValueReturnStatement() ||
-          pStatement->isOutputStatement())
-        return true;
-      for (KvCCfgVariable* pDefined : pStatement->getDefinedVariables())
-        if (pDefined->isSSAVariable()) return true;
-    }
-  }
-  return false;
 }
 
 class Lowering {

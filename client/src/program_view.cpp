@@ -185,13 +185,7 @@ void ProgramView::assignLabels(const ProcedureView& procedure) {
     else if (needsLabel(v, i == 0 ? node() : procedure.blocks[i - 1]))
       unnamed.push_back(v);
   }
-  for (node v : unnamed) {
-    std::string label = "bb" + std::to_string(m_Graph.getBasicBlock(v)->getIndex());
-    std::string candidate = label;
-    for (int suffix = 1; !used.insert(candidate).second; ++suffix)
-      candidate = label + "_" + std::to_string(suffix);
-    m_Labels[v.index()] = candidate;
-  }
+  for (node v : unnamed) m_Labels[v.index()] = unusedBlockName(*m_Graph.getBasicBlock(v), used);
 }
 
 // What phi operands and parameter statements name: predecessors and the blocks holding calls.
@@ -296,6 +290,30 @@ std::vector<edge> ProgramView::controlInEdges(node v) const {
   for (edge e : m_Graph.in(v))
     if (!m_Graph.inf(e)->isSSAEdge()) edges.push_back(e);
   return edges;
+}
+
+bool isInSSAForm(const KvCControlFlowGraph& graph) {
+  for (node v : graph.nodes()) {
+    KvCBasicBlock* pBlock = graph.getBasicBlock(v);
+    if (!pBlock) continue;
+    if (!pBlock->getPhiFunctions().empty()) return true;
+    for (KvCCfgStatement* pStatement : pBlock->getStatementSeq()) {
+      if (pStatement->isParamStatement() || pStatement->isValueReturnStatement() ||
+          pStatement->isOutputStatement())
+        return true;
+      for (KvCCfgVariable* pDefined : pStatement->getDefinedVariables())
+        if (pDefined->isSSAVariable()) return true;
+    }
+  }
+  return false;
+}
+
+std::string unusedBlockName(const KvCBasicBlock& block, std::set<std::string>& used) {
+  std::string name = "bb" + std::to_string(block.getIndex());
+  std::string candidate = name;
+  for (int suffix = 1; !used.insert(candidate).second; ++suffix)
+    candidate = name + "_" + std::to_string(suffix);
+  return candidate;
 }
 
 }  // namespace ssaopt::client::detail

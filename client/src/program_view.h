@@ -14,6 +14,7 @@
 //   branch targets "end"). Edges to them read "end".
 #pragma once
 
+#include <set>
 #include <string>
 #include <unordered_map>
 #include <unordered_set>
@@ -82,5 +83,12 @@ private:
   std::unordered_map<KvCCfgProcedureCall*, std::string> m_CallSites;
   std::unordered_map<KvCCfgVariable*, std::uint32_t> m_VersionNumbers;
 };
+
+// "bb" and the block's index, with "_1", "_2", ... added until it is not in `used`; added to `used`.
+std::string unusedBlockName(const KvCBasicBlock& block, std::set<std::string>& used);
+
+// Whether the SSA transformation ran, by what it leaves behind: phi functions, interface statements or
+// versions. Until it has placed the parameter statements, calls pass their arguments themselves.
+bool isInSSAForm(const KvCControlFlowGraph& graph);
 
 }  // namespace ssaopt::client::detail

@@ -9,6 +9,7 @@
 //
 // Needs SSA form and divided blocks (one phi function, one statement or the condition alone).
 #include <algorithm>
+#include <cstring>
 #include <functional>
 
 #include "ssaopt/cfg/control_flow_graph.h"
@@ -66,6 +67,38 @@ void dropInvertedRange(KvCCfgVariable& variable) {
   variable.setMaxValueAndDestroyOld(unknown);
 }
 
+// The value and range of a variable before a visit, to tell whether the visit changed any of them. Bit
+// for bit: -0.0 after +0.0 compares equal as a value of the lattice, yet prints differently.
+class DefinitionSnapshot {
+public:
+  explicit DefinitionSnapshot(const KvCCfgVariable& variable)
+      : m_Value(variable.getValue()), m_Min(variable.getMinValue()), m_Max(variable.getMaxValue()) {}
+
+  bool matches(const KvCCfgVariable& variable) const {
+    return m_Value.matches(variable.getValue()) && m_Min.matches(variable.getMinValue()) &&
+           m_Max.matches(variable.getMaxValue());
+  }
+
+private:
+  // A copy of a value object, or of its absence.
+  struct Copy {
+    explicit Copy(const KvCCfgValue* pValue)
+        : present(pValue != nullptr), value(pValue ? *pValue : KvCCfgValue()) {}
+
+    bool matches(const KvCCfgValue* pValue) const {
+      if (!present || !pValue) return present == (pValue != nullptr);
+      double before = value.getValue(), after = pValue->getValue();
+      return value.getValueKind() == pValue->getValueKind() &&
+             std::memcmp(&before, &after, sizeof before) == 0;
+    }
+
+    bool present;
+    KvCCfgValue value;
+  };
+
+  Copy m_Value, m_Min, m_Max;
+};
+
 }  // namespace
 
 void KvCControlFlowGraph::propagateSparseConditionalConstant(bool removeDeadCode) {
@@ -96,24 +129,92 @@ void KvCControlFlowGraph::buildVarUses() {
 
 // Passes repeat while a pass made a variable constant or dead-code removal took a phi operand away,
 // for either can make a condition constant that was not before. The procedures are taken in the
-// table's order, ascending by name.
+// table's order, ascending by name; a pass passes over those that would repeat their last visit
+// exactly (see PropagationRecord), except the last one, whose executable flags are the ones that
+// stay.
 void KvCControlFlowGraph::sparseConditionalConstant(bool removeDeadCode) {
   list<edge> cfgWorkList;
   list<edge> ssaWorkList;
+  startPropagationRecord();
+  // What the first visit's start would do; every later visit then clears only what the visit before
+  // it set, and dead-code elimination deletes no edge that carries the flag.
+  clearAllVisited();
+  if (!m_Procedures.empty()) deactivateAllEdges();
+  int last = static_cast<int>(m_Procedures.size()) - 1;
   bool repeat = true;
   while (repeat) {
     bool changed = false;
-    clearAllVisited();
-    // What the first procedure's start would do; the later ones then clear only what their
-    // predecessors set.
-    if (!m_Procedures.empty()) deactivateAllEdges();
-    for (const auto& named : m_Procedures)
-      propagateFrom(named.second->getEntryNode(), cfgWorkList, ssaWorkList, changed);
+    for (int procedure = 0; procedure <= last; ++procedure)
+      if (m_Propagation.unsettled[static_cast<std::size_t>(procedure)] || procedure == last)
+        visitProcedure(procedure, cfgWorkList, ssaWorkList, changed);
     bool deleted = removeDeadCode && eliminateDeadCode();
     repeat = changed || deleted;
   }
   // The flags stay as the last procedure left them; the record of them must not outlive the edges.
   m_ExecutableEdges.clear();
+  m_Propagation = PropagationRecord();
+}
+
+// Numbers the procedures and gives every node the number of the procedure whose entry reaches it
+// along control-flow edges (procedures are the components of those). Every procedure is unsettled.
+void KvCControlFlowGraph::startPropagationRecord() {
+  std::size_t count = m_Procedures.size();
+  m_Propagation.procedureOf.init(*this, -1);
+  m_Propagation.unsettled.assign(count, true);
+  m_Propagation.visitedBy.assign(count, {});
+  m_Propagation.entries.clear();
+  ssaopt::array<node> stack;
+  for (const auto& named : m_Procedures) {
+    int procedure = static_cast<int>(m_Propagation.entries.size());
+    node entry = named.second->getEntryNode();
+    m_Propagation.entries.push_back(entry);
+    m_Propagation.procedureOf[entry] = procedure;
+    stack.push_back(entry);
+    while (!stack.empty()) {
+      node v = stack.back();
+      stack.pop_back();
+      for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) {
+        node w = target(e);
+        if (m_Propagation.procedureOf[w] != -1) continue;
+        m_Propagation.procedureOf[w] = procedure;
+        stack.push_back(w);
+      }
+    }
+  }
+}
+
+// The visit starts from the marks of the procedure's last visit cleared, as a pass that clears all
+// marks would leave them.
+void KvCControlFlowGraph::visitProcedure(int procedure, list<edge>& cfgWorkList, list<edge>& ssaWorkList,
+                                         bool& changed) {
+  std::size_t i = static_cast<std::size_t>(procedure);
+  m_Propagation.unsettled[i] = false;
+  for (node v : m_Propagation.visitedBy[i]) m_Visited[v] = false;
+  m_Propagation.visitedBy[i].clear();
+  m_Propagation.current = procedure;
+  propagateFrom(m_Propagation.entries[i], cfgWorkList, ssaWorkList, changed);
+}
+
+void KvCControlFlowGraph::unsettleDefinitionAt(node v) {
+  unsettleProcedureOf(v);
+  for (edge e : out(v))
+    if (inf(e)->isSSAEdge()) unsettleProcedureOf(target(e));
+}
+
+void KvCControlFlowGraph::unsettleProcedureOf(node v) {
+  int procedure = m_Propagation.procedureOf[v];
+  if (procedure >= 0) m_Propagation.unsettled[static_cast<std::size_t>(procedure)] = true;
+}
+
+// The blocks it leads to lose in-edges and phi operands; a deleted call takes its arguments out of the
+// parameter statements of the procedure it calls.
+void KvCControlFlowGraph::unsettleProceduresOfDeadBlock(node n) {
+  unsettleProcedureOf(n);
+  for (edge e = firstCfgOutEdge(n); e; e = nextCfgOutEdge(e)) unsettleProcedureOf(target(e));
+  for (KvCCfgStatement* pStatement : getBasicBlock(n)->getStatementSeq())
+    if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall())
+      if (KvCCfgProcedure* pCallee = findProcedure(pCall->getName()))
+        unsettleProcedureOf(pCallee->getEntryNode());
 }
 
 // The two lists are served in turn, one edge each, until both are empty.
@@ -166,6 +267,7 @@ void KvCControlFlowGraph::flowStep(list<edge>& cfgWorkList, list<edge>& ssaWorkL
   node v = target(e);
   if (KvCBasicBlock* pBlock = getBasicBlock(v)) {
     setVisited(v);
+    m_Propagation.visitedBy[static_cast<std::size_t>(m_Propagation.current)].push_back(v);
     if (KvCPhiFunction* pPhi = pBlock->isPhiFunction())
       visitPhiFunction(pPhi, v, changed);
     else if (countExecutableInEdges(v) == 1)
@@ -232,6 +334,7 @@ template <class Definition>
 void KvCControlFlowGraph::visitDefinition(KvCCfgVariable* pVariable, const Definition& definition, node v,
                                           list<edge>& cfgWorkList, list<edge>& ssaWorkList, bool& changed,
                                           bool stores) {
+  DefinitionSnapshot before(*pVariable);
   KvCCfgValue* pOld = pVariable->getValue();
   KvCCfgValue value = definition.evaluate();
   if (stores)
@@ -239,6 +342,7 @@ void KvCControlFlowGraph::visitDefinition(KvCCfgVariable* pVariable, const Defin
   else
     pVariable->setVarValue(value);
   recordRange(pVariable, definition);
+  if (!before.matches(*pVariable)) unsettleDefinitionAt(v);
   if (pOld->compare(value) != 0) {
     if (pOld->isUndetermined() && value.isConstant()) changed = true;
     appendSSAOutEdges(v, ssaWorkList);
@@ -279,8 +383,9 @@ void KvCControlFlowGraph::visitBranchCondition(KvCCfgExpression* pCond, node v, 
 // A join of thousands of edges is merged again on every one of them that becomes executable, so the
 // merge reuses one list for the values and the two bounds. The operands hold values their
 // definitions already adjusted to the variable, so the meet is stored as it is.
-void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node /*v*/, bool& changed) {
+void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node v, bool& changed) {
   KvCCfgVariable* pVariable = pPhi->getVariable();
+  DefinitionSnapshot before(*pVariable);
   KvCCfgValue* pOld = pVariable->getValue();
   ssaopt::array<KvCCfgVariable*> operands = distinctOperands(*pPhi);
   list<KvCCfgValue*> merged(operands.size());
@@ -296,6 +401,7 @@ void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node /*v*/, boo
            [](KvCCfgVariable* pOperand) { return boundOf(pOperand->getMaxValue(), *pOperand); });
   KvCCfgValue maximum = determineMaximum(merged);
   pVariable->setMaxValueAndDestroyOld(maximum);
+  if (!before.matches(*pVariable)) unsettleDefinitionAt(v);
   delete pOld;
 }
 

@@ -39,6 +39,7 @@ bool KvCControlFlowGraph::eliminateDeadCode() {
   bool removedOperand = false;
   for (node n : nodes()) {
     if (!isDeadBlock(n)) continue;
+    unsettleProceduresOfDeadBlock(n);
     while (node t = reachedPhiSuccessor(n)) {
       removeDeadOperands(t);
       removedOperand = true;

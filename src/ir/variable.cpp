@@ -2,6 +2,8 @@
 // value ranges, the replacement stack, aliases and use sets.
 #include "ssaopt/ir/variable.h"
 
+#include <functional>
+
 #include "ssaopt/frame/control.h"
 #include "ssaopt/frame/report.h"
 #include "ssaopt/frame/types.h"
@@ -165,3 +167,11 @@ double KvCSSAVariable::getUpperLimit() const { return m_pOrigVar->getUpperLimit(
 double KvCSSAVariable::getLowerLimit() const { return m_pOrigVar->getLowerLimit(); }
 
 const KvCCfgValue* KvCSSAVariable::getInitValue() const { return m_pOrigVar->getInitValue(); }
+
+// Null (an operand not set) comes first. Indexes repeat only after the counter is restarted or
+// wraps; the address then keeps the order total.
+bool ssaopt::set_order<KvCCfgVariable*>::operator()(const KvCCfgVariable* a, const KvCCfgVariable* b) const {
+  if (!a || !b) return !a && b;
+  if (a->getIndex() != b->getIndex()) return a->getIndex() < b->getIndex();
+  return std::less<const KvCCfgVariable*>()(a, b);
+}

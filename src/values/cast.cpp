@@ -52,7 +52,8 @@ double castNumber(const KV_DataType& type, double number, bool normaliseBool) {
   for (const IntegerTarget& target : kIntegerTargets)
     if ((base->*target.test)()) return wrapInteger(number, target.width, target.isSigned);
   if (!type.isBool()) return number;
-  if (normaliseBool) return number == 0.0 ? number : 1.0;
+  // -0.0 becomes +0.0: a Boolean holds 0 or 1, and 1 / b must not tell the zeros apart.
+  if (normaliseBool) return number == 0.0 ? 0.0 : 1.0;
   return wrapInteger(number, kBoolWidth, false);
 }
 

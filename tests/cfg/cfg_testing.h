@@ -12,6 +12,7 @@
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/frame/graph_algorithms.h"
 #include "ssaopt/frame/pool.h"
+#include "ssaopt/frame/report.h"
 #include "ssaopt/ir/procedure.h"
 
 // The private members that later transformations use, opened to the tests.
@@ -21,9 +22,7 @@ public:
                                      ssaopt::map<ssaopt::node, KvCCfgProcedure*>& procedureOf) {
     G.buildFunctionCallGraph(fcg, procedureOf);
   }
-  static void setVisited(KvCControlFlowGraph& G, ssaopt::node v) { G.setVisited(v); }
   static bool isVisited(const KvCControlFlowGraph& G, ssaopt::node v) { return G.isVisited(v); }
-  static void clearAllVisited(KvCControlFlowGraph& G) { G.clearAllVisited(); }
 };
 
 namespace cfgtest {
@@ -89,6 +88,21 @@ protected:
   ssaopt::PoolMemController m_Pool;
   ssaopt::PoolMemController::Scope m_Scope{&m_Pool};
   KvCControlFlowGraph G;
+};
+
+// Internal checks on throughout; a test that expects reports says so, any other must leave them quiet.
+class QuietCfgTest : public CfgTest {
+protected:
+  void TearDown() override { EXPECT_TRUE(m_ReportsExpected || m_Log.empty()) << "unexpected reports"; }
+  // What a refusal must leave as it was.
+  std::vector<int> shape() {
+    return {G.number_of_nodes(), G.number_of_edges(), static_cast<int>(G.getProcedures().size())};
+  }
+
+  irtest::InternalInfoOn m_Info;
+  ssaopt::ReportLog m_Log;
+  bool m_ReportsExpected = false;
+  KvCCfgProcedure* pMain = procedure("#main");
 };
 
 // Invariants 1 to 6 of a finished graph (every procedure entered at its first block), checked from

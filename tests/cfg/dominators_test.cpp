@@ -1,5 +1,6 @@
-// Immediate dominators, dominator trees and dominance frontiers: the shapes that matter one by one,
-// components without a root, and the fast computation against a simple fixed point on random graphs.
+// Immediate dominators, dominator trees and dominance frontiers: a tree per procedure, components
+// without a root, and the fast computation against a simple fixed point on random graphs (which bring
+// loops, self-loops and irreducible regions).
 #include <gtest/gtest.h>
 
 #include <cstdint>
@@ -43,87 +44,6 @@ protected:
   Access::Trees m_Trees;
   int m_Count = 0;
 };
-
-TEST_F(Dominators, OfAnEntryWithoutEdgesAreNone) {
-  compute();
-  EXPECT_EQ(idom(entry), ssaopt::nil);
-  ASSERT_EQ(m_Count, 1);
-  EXPECT_EQ(root(0), entry);
-  EXPECT_TRUE(children(0, entry).empty());
-  EXPECT_TRUE(frontier(entry).empty());
-}
-
-TEST_F(Dominators, OfAStraightLineAreThePredecessorsWithEmptyFrontiers) {
-  node a = startWith(pMain, block(pMain)), b = block(pMain), c = block(pMain);
-  plain(a, b);
-  plain(b, c);
-  compute();
-  EXPECT_EQ(idom(a), entry);
-  EXPECT_EQ(idom(b), a);
-  EXPECT_EQ(idom(c), b);
-  EXPECT_EQ(children(0, a), Nodes{b});
-  for (node v : {entry, a, b, c}) EXPECT_TRUE(frontier(v).empty());
-}
-
-TEST_F(Dominators, OfADiamondMeetAtTheTopAndTheJoinIsInBothBranchesFrontiers) {
-  node a = startWith(pMain, block(pMain, 0, true)), b = block(pMain), c = block(pMain), d = block(pMain);
-  onTrue(a, b);
-  onFalse(a, c);
-  plain(c, d);
-  plain(b, d);
-  compute();
-  for (node v : {b, c, d}) EXPECT_EQ(idom(v), a);
-  EXPECT_EQ(children(0, a), (Nodes{b, c, d})) << "children in node order";
-  EXPECT_EQ(frontier(b), Nodes{d});
-  EXPECT_EQ(frontier(c), Nodes{d});
-  EXPECT_TRUE(frontier(a).empty());
-  EXPECT_TRUE(frontier(d).empty());
-}
-
-TEST_F(Dominators, OfALoopPutTheHeaderIntoItsOwnFrontierAndASelfLoopIntoItsNodes) {
-  node header = startWith(pMain, block(pMain, 0, true)), body = block(pMain), spin = block(pMain),
-       done = block(pMain);
-  onTrue(header, body);
-  plain(body, spin);
-  plain(spin, spin);
-  plain(spin, header);
-  onFalse(header, done);
-  compute();
-  EXPECT_EQ(idom(header), entry);
-  EXPECT_EQ(idom(spin), body);
-  EXPECT_EQ(idom(done), header);
-  EXPECT_EQ(frontier(spin), (Nodes{header, spin}));
-  EXPECT_EQ(frontier(body), Nodes{header});
-  EXPECT_EQ(frontier(header), Nodes{header});
-}
-
-TEST_F(Dominators, OfAnIrreducibleRegionAreItsCommonDominator) {
-  node a = startWith(pMain, block(pMain, 0, true)), b = block(pMain), c = block(pMain);
-  onTrue(a, b);
-  onFalse(a, c);
-  plain(b, c);
-  plain(c, b);
-  compute();
-  EXPECT_EQ(idom(b), a);
-  EXPECT_EQ(idom(c), a);
-  EXPECT_EQ(frontier(b), Nodes{c});
-  EXPECT_EQ(frontier(c), Nodes{b});
-}
-
-TEST_F(Dominators, OfTwoProceduresAreTwoTreesInComponentOrderAndAddNoNode) {
-  KvCCfgProcedure* pOther = procedure("other");
-  node b = startWith(pOther, block(pOther)), a = startWith(pMain, block(pMain));
-  int nodes = G.number_of_nodes(), edges = G.number_of_edges();
-  compute();
-  EXPECT_EQ(G.number_of_nodes(), nodes);
-  EXPECT_EQ(G.number_of_edges(), edges);
-  ASSERT_EQ(m_Count, 2);
-  EXPECT_EQ(root(0), entry);
-  EXPECT_EQ(root(1), pOther->getEntryNode());
-  EXPECT_EQ(children(0, entry), Nodes{a});
-  EXPECT_EQ(children(1, pOther->getEntryNode()), Nodes{b});
-  EXPECT_EQ(idom(b), pOther->getEntryNode());
-}
 
 // A procedure that never reaches its end leaves its exit node alone in a component; a cycle that
 // nothing enters has no node without in-edges at all.

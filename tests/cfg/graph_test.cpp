@@ -1,5 +1,5 @@
-// The graph object and block surgery: the procedure table, payload ownership, visited marks, splits,
-// division into one-item blocks, the search for a branch node, and the consistency check.
+// Block surgery where programs cannot go: splits and the search for a branch node that fail, and the
+// consistency check.
 #include <gtest/gtest.h>
 
 #include <type_traits>
@@ -8,124 +8,12 @@
 #include "ssaopt/frame/report.h"
 
 using namespace cfgtest;
-using ssaopt::nil;
-
-namespace {
-
-// Payloads that count their destruction, to show that the graph deletes none.
-struct CountedBlock : KvCBasicBlock {
-  explicit CountedBlock(int& count) : m_Count(count) {}
-  ~CountedBlock() override { ++m_Count; }
-  int& m_Count;
-};
-struct CountedEdge : KvCCfgEdgeInfo {
-  explicit CountedEdge(int& count) : m_Count(count) {}
-  ~CountedEdge() override { ++m_Count; }
-  int& m_Count;
-};
-
-}  // namespace
 
 static_assert(!std::is_copy_constructible_v<KvCControlFlowGraph> &&
                   !std::is_copy_assignable_v<KvCControlFlowGraph>,
               "a copy would name the nodes of its source");
 
-using GraphObject = CfgTest;
-
-TEST_F(GraphObject, StartsEmptyAndKeepsProceduresInNameOrder) {
-  EXPECT_EQ(G.getStartNode(), nil);
-  EXPECT_TRUE(G.checkConsistency());
-  KvCCfgProcedure* pStep = procedure("step");
-  KvCCfgProcedure* pMain = procedure("#main");
-  G.setStartNode(pMain->getEntryNode());
-
-  EXPECT_EQ(G.getStartNode(), pMain->getEntryNode());
-  EXPECT_EQ(G.findProcedure("step"), pStep);
-  EXPECT_EQ(G.findProcedure("other"), nullptr);
-  std::vector<std::string> names;
-  for (const auto& named : G.getProcedures()) names.push_back(named.first.cstring());
-  EXPECT_EQ(names, (std::vector<std::string>{"#main", "step"}));
-}
-
-TEST_F(GraphObject, DeletingNodesEdgesOrTheGraphDeletesNoPayload) {
-  int blocksGone = 0, edgesGone = 0;
-  CountedBlock* pKept = nullptr;
-  {
-    KvCControlFlowGraph local;
-    node a = local.new_node(new CountedBlock(blocksGone));
-    node b = local.new_node(pKept = new CountedBlock(blocksGone));
-    local.new_edge(a, b, new CountedEdge(edgesGone));
-    local.new_edge(b, a, new CountedEdge(edgesGone));
-    local.del_edge(local.first_adj_edge(a));
-    local.del_node(a);
-  }
-  EXPECT_EQ(blocksGone, 0);
-  EXPECT_EQ(edgesGone, 0);
-  delete pKept;
-  EXPECT_EQ(blocksGone, 1);
-}
-
-TEST_F(GraphObject, VisitedMarksReadFalseUntilSetAndAfterClearing) {
-  using Access = KvCControlFlowGraphTestAccess;
-  node a = block(nullptr), b = block(nullptr);
-  EXPECT_FALSE(Access::isVisited(G, a));
-  Access::setVisited(G, b);
-  EXPECT_TRUE(Access::isVisited(G, b));
-  EXPECT_FALSE(Access::isVisited(G, a));
-  Access::clearAllVisited(G);
-  node c = block(nullptr);
-  for (node v : {a, b, c}) EXPECT_FALSE(Access::isVisited(G, v));
-}
-
 using Splits = CfgTest;
-
-TEST_F(Splits, AtTheFirstStatementNothingChanges) {
-  node v = block(procedure("#main"), 3);
-  EXPECT_EQ(G.splitAtStatement(v, statement(v, 0)), v);
-  EXPECT_EQ(G.number_of_nodes(), 2);
-  EXPECT_EQ(G.number_of_edges(), 0);
-}
-
-TEST_F(Splits, ABranchingBlockHandsItsBranchesToTheNewBlock) {
-  KvCCfgProcedure* pMain = procedure("#main");
-  node before = block(pMain), v = block(pMain, 3, true), yes = block(pMain), no = block(pMain);
-  plain(before, v);
-  edge t = onTrue(v, yes), f = onFalse(v, no);
-  KvCCfgEdgeInfo *pTrue = G.inf(t), *pFalse = G.inf(f);
-  KvCCfgStatement* pSecond = statement(v, 1);
-
-  node w = G.splitAtStatement(v, pSecond);
-
-  ASSERT_NE(w, v);
-  EXPECT_EQ(predecessors(v), Nodes{before});
-  EXPECT_EQ(successors(v), Nodes{w});
-  KvCCfgEdgeInfo* pLink = G.inf(G.first_adj_edge(v));
-  EXPECT_FALSE(pLink->isTrueBranch() || pLink->isFalseBranch());
-  EXPECT_EQ(successors(w), (Nodes{yes, no}));
-  EXPECT_EQ(G.inf(G.first_adj_edge(w)), pTrue);
-  EXPECT_EQ(G.inf(G.last_adj_edge(w)), pFalse);
-  EXPECT_EQ(blockOf(v).getStatementSeq().size(), 1u);
-  EXPECT_EQ(statement(w, 0), pSecond);
-  EXPECT_NE(condition(w), nullptr);
-  EXPECT_EQ(procedureOf(w), pMain);
-}
-
-TEST_F(Splits, AtTheConditionOnlyWhenThereAreStatements) {
-  KvCCfgProcedure* pMain = procedure("#main");
-  node v = block(pMain, 2, true), bare = block(pMain, 0, true), next = block(pMain);
-  onTrue(v, next);
-  onFalse(v, next);
-  KvCCfgExpression* pCond = condition(v);
-
-  node w = G.splitAtCondition(v);
-
-  EXPECT_EQ(condition(v), nullptr);
-  EXPECT_EQ(blockOf(v).getStatementSeq().size(), 2u);
-  EXPECT_EQ(condition(w), pCond);
-  EXPECT_TRUE(blockOf(w).getStatementSeq().empty());
-  EXPECT_EQ(successors(w), (Nodes{next, next}));
-  EXPECT_EQ(G.splitAtCondition(bare), bare);
-}
 
 TEST_F(Splits, ReportNodesWithoutBlockAndChangeNothing) {
   KvCCfgProcedure* pMain = procedure("#main");
@@ -148,58 +36,6 @@ TEST_F(Splits, ReportNodesWithoutBlockAndChangeNothing) {
   EXPECT_EQ(G.number_of_nodes(), 3);
   EXPECT_EQ(G.number_of_edges(), 2);
   EXPECT_TRUE(G.checkConsistency());
-}
-
-using Division = CfgTest;
-
-TEST_F(Division, MakesAChainThatTakesTheEdgesAndDropsTheOldNode) {
-  KvCCfgProcedure* pMain = procedure("#main");
-  irtest::TestVariable x, y;
-  node left = block(pMain, 0, true), right = block(pMain), v = block(pMain, 2, true), yes = block(pMain),
-       no = block(pMain);
-  KvCPhiFunction *pPhiX = new KvCPhiFunction(&x, 2), *pPhiY = new KvCPhiFunction(&y, 2);
-  blockOf(v).append(pPhiX);
-  blockOf(v).append(pPhiY);
-  KvCCfgStatement *pFirst = statement(v, 0), *pSecond = statement(v, 1);
-  KvCCfgExpression* pCond = condition(v);
-  edge fromLeft = onTrue(left, v);
-  onFalse(left, right);
-  edge fromRight = plain(right, v);
-  edge t = onTrue(v, yes), f = onFalse(v, no);
-
-  G.divideBasicBlock();
-
-  node head = G.target(fromLeft);
-  std::vector<edge> into;
-  for (edge e : G.in(head)) into.push_back(e);
-  EXPECT_EQ(into, (std::vector<edge>{fromLeft, fromRight}));
-  EXPECT_NE(G.inf(fromLeft)->isTrueBranch(), nullptr);
-  Nodes chain{head};
-  while (chain.size() < 5) chain.push_back(successors(chain.back()).at(0));
-  node tail = chain.back();
-  EXPECT_EQ(blockOf(chain[0]).isPhiFunction(), pPhiX);
-  EXPECT_EQ(blockOf(chain[1]).isPhiFunction(), pPhiY);
-  EXPECT_EQ(blockOf(chain[2]).isStatement(), pFirst);
-  EXPECT_EQ(blockOf(chain[3]).isStatement(), pSecond);
-  EXPECT_EQ(condition(tail), pCond);
-  EXPECT_TRUE(blockOf(tail).getStatementSeq().empty());
-  EXPECT_EQ(G.source(t), tail);
-  EXPECT_EQ(G.source(f), tail);
-  for (node link : chain) EXPECT_EQ(procedureOf(link), pMain);
-  // v gave way to five blocks and the condition-only block `left` to one; the empty blocks stay.
-  EXPECT_EQ(G.number_of_nodes(), 6 + 4);
-  EXPECT_NE(G.source(fromLeft), left);
-  EXPECT_EQ(G.source(fromRight), right);
-}
-
-TEST_F(Division, ABlockThatLoopsToItselfLoopsFromItsLastLinkToItsFirst) {
-  node v = block(procedure("#main"), 2);
-  plain(v, v);
-  G.divideBasicBlock();
-  node first = G.target(G.first_edge());
-  node last = successors(first).at(0);
-  EXPECT_EQ(successors(last), Nodes{first});
-  EXPECT_EQ(predecessors(first), Nodes{last});
 }
 
 using BranchSearch = CfgTest;

@@ -1,6 +1,6 @@
-// Procedures and calls: the procedure table, regions made procedures (with the single-entry
-// repetition and its regressions), call arguments, exit nodes, the loop around "#main" and the
-// function call graph.
+// Procedures and calls: regions made procedures (with the single-entry repetition and its
+// regressions), and what the procedure steps refuse and report. The ordinary cases are programs
+// (tests/client).
 #include <gtest/gtest.h>
 #include <pthread.h>
 
@@ -16,22 +16,10 @@ using Names = std::vector<std::string>;
 
 namespace {
 
-// Every test here runs with the internal checks on and expects them quiet unless it says otherwise.
-class ProcedureTest : public CfgTest {
+class ProcedureTest : public QuietCfgTest {
 protected:
-  void TearDown() override { EXPECT_TRUE(m_ReportsExpected || m_Log.empty()) << "unexpected reports"; }
   KvCCfgProcedure* find(const std::string& name) { return G.findProcedure(name.c_str()); }
   void call(node v, const char* name) { blockOf(v).append(new KvCCfgProcedureCall(name)); }
-
-  // What a refusal must leave as it was.
-  std::vector<int> shape() {
-    return {G.number_of_nodes(), G.number_of_edges(), static_cast<int>(G.getProcedures().size())};
-  }
-
-  irtest::InternalInfoOn m_Info;
-  ssaopt::ReportLog m_Log;
-  bool m_ReportsExpected = false;
-  KvCCfgProcedure* pMain = procedure("#main");
 };
 
 // A recursion as deep as the nest would not fit into this stack.
@@ -51,60 +39,7 @@ void runOnSmallStack(std::function<void()> work) {
 
 }  // namespace
 
-using ProcedureTable = ProcedureTest;
-
-TEST_F(ProcedureTable, DemandingANameAgainGivesTheSameEntryAndRecord) {
-  KvCCfgProcedure* pAgain = nullptr;
-  node entry = G.demandProcedureEntryNode("#main", pAgain);
-  EXPECT_EQ(pAgain, pMain);
-  EXPECT_EQ(entry, pMain->getEntryNode());
-  EXPECT_EQ(G.inf(entry)->isEntryNode()->getProcedure(), pMain);
-  EXPECT_EQ(G.getProcedures().size(), 1u);
-  EXPECT_EQ(G.number_of_nodes(), 1);
-  EXPECT_EQ(G.number_of_edges(), 0);
-}
-
 using MakeProcedure = ProcedureTest;
-
-TEST_F(MakeProcedure, AfterAPlainBlockThePredecessorEndsInTheCall) {
-  node a = startWith(pMain, block(pMain, 1)), b = block(pMain, 1), c = block(pMain, 1);
-  plain(a, b);
-  plain(b, c);
-  std::string name = procedureNamedAfter(b);
-
-  KvCCfgProcedureCall* pCall = G.makeProcedureAndCall(b);
-
-  ASSERT_NE(pCall, nullptr);
-  EXPECT_EQ(pCall->getName().cstring(), name);
-  EXPECT_EQ(G.outdeg(a), 0);
-  EXPECT_EQ(callsIn(a), Names{name});
-  KvCCfgProcedure* pNew = find(name);
-  ASSERT_NE(pNew, nullptr);
-  EXPECT_EQ(successors(pNew->getEntryNode()), Nodes{b});
-  EXPECT_EQ(procedureOf(a), pMain);
-  EXPECT_EQ(procedureOf(b), pNew);
-  EXPECT_EQ(procedureOf(c), pNew);
-  EXPECT_TRUE(pMain->getCalls().empty() && pNew->getCalls().empty()) << "placed calls are not registered";
-  expectInvariants(G);
-  delete pCall;
-}
-
-TEST_F(MakeProcedure, AfterATrueEdgeTheCallGetsABlockOfItsOwnOnThatEdge) {
-  node a = startWith(pMain, block(pMain, 1, true)), b = block(pMain, 1), no = block(pMain);
-  edge t = onTrue(a, b);
-  onFalse(a, no);
-  KvCCfgEdgeInfo* pTrue = G.inf(t);
-
-  delete G.makeProcedureAndCall(b);
-
-  node callBlock = G.target(t);
-  EXPECT_EQ(G.inf(t), pTrue);
-  EXPECT_EQ(successors(a), (Nodes{callBlock, no}));
-  EXPECT_EQ(callsIn(callBlock), Names{procedureNamedAfter(b)});
-  EXPECT_EQ(blockOf(callBlock).getStatementSeq().size(), 1u);
-  EXPECT_EQ(procedureOf(callBlock), pMain);
-  expectInvariants(G);
-}
 
 TEST_F(MakeProcedure, OnTheFirstBlockOfAProcedureItOnlyCallsThatProcedure) {
   node a = startWith(pMain, block(pMain, 1)), b = block(pMain, 1);
@@ -121,30 +56,6 @@ TEST_F(MakeProcedure, OnTheFirstBlockOfAProcedureItOnlyCallsThatProcedure) {
   EXPECT_EQ(pCall->getName().cstring(), procedureNamedAfter(b));
   EXPECT_EQ(shape(), before);
   delete pCall;
-}
-
-// E -> a -> h [if] -T-> body -> h,  h -F-> after
-TEST_F(MakeProcedure, ALoopHeaderEnteredFromOutsideBecomesAProcedureOfItsOwn) {
-  node a = startWith(pMain, block(pMain, 1)), h = block(pMain, 0, true), body = block(pMain, 1),
-       after = block(pMain, 1);
-  plain(a, h);
-  onTrue(h, body);
-  plain(body, h);
-  onFalse(h, after);
-  std::string bodyName = procedureNamedAfter(body), headerName = procedureNamedAfter(h);
-
-  delete G.makeProcedureAndCall(body);
-
-  KvCCfgProcedure *pBody = find(bodyName), *pHeader = find(headerName);
-  ASSERT_TRUE(pBody && pHeader);
-  EXPECT_EQ(G.getProcedures().size(), 3u);
-  EXPECT_EQ(firstBlock(pBody), body);
-  EXPECT_EQ(firstBlock(pHeader), h);
-  EXPECT_EQ(callsIn(a), Names{headerName});
-  EXPECT_EQ(callsIn(body), Names{headerName});
-  EXPECT_EQ(callsIn(successors(h).at(0)), Names{bodyName});
-  EXPECT_EQ(procedureOf(after), pHeader);
-  expectInvariants(G);
 }
 
 // A procedure whose body begins with a loop: the header took the entry's procedure name, changed
@@ -267,29 +178,6 @@ TEST_F(MakeProcedure, RefusalsAreReportedAndChangeNothing) {
 
 using Parameters = ProcedureTest;
 
-TEST_F(Parameters, TwoCallsShareTheProceduresParameterStatements) {
-  KvCCfgProcedure* pStep = procedure("step");
-  irtest::TestVariable x, y;
-  irtest::TestExpression x1, y1, x2, y2;
-  KvCCfgProcedureCall first("step"), second("step");
-  ssaopt::list<KvCCfgVariable*> formals{&x, &y};
-  ssaopt::list<KvCCfgExpression*> arguments{&x1, &y1};
-  G.setParametersOfCall(&first, formals, arguments);
-  EXPECT_TRUE(formals.empty() && arguments.empty());
-  formals = {&x, &y};
-  arguments = {&x2, &y2};
-  G.setParametersOfCall(&second, formals, arguments);
-
-  auto params = irtest::items(pStep->getParamStatements());
-  ASSERT_EQ(params.size(), 2u);
-  EXPECT_EQ(params[0]->getVariable(), &x);
-  EXPECT_EQ(params[1]->getVariable(), &y);
-  EXPECT_EQ(params[0]->getArgument(&first), &x1);
-  EXPECT_EQ(params[0]->getArgument(&second), &x2);
-  EXPECT_EQ(params[1]->getArgument(&first), &y1);
-  EXPECT_EQ(params[1]->getArgument(&second), &y2);
-}
-
 TEST_F(Parameters, ACallThatDoesNotFitIsReportedAndRecordsNothing) {
   m_ReportsExpected = true;
   KvCCfgProcedure* pStep = procedure("step");
@@ -317,56 +205,7 @@ TEST_F(Parameters, ACallThatDoesNotFitIsReportedAndRecordsNothing) {
   EXPECT_EQ(m_Log.messages().size(), 2u);
 }
 
-using ExitNodes = ProcedureTest;
-
-TEST_F(ExitNodes, EveryDeadEndOfAProcedureLeadsToItsOneExit) {
-  KvCCfgProcedure *pNone = procedure("endless"), *pOne = procedure("one"), *pTwo = procedure("two");
-  node spin = startWith(pNone, block(pNone));
-  plain(spin, spin);
-  node single = startWith(pOne, block(pOne)), end = block(pOne);
-  plain(single, end);
-  node fork = startWith(pTwo, block(pTwo, 0, true)), left = block(pTwo), right = block(pTwo);
-  onTrue(fork, left);
-  onFalse(fork, right);
-  startWith(pMain, block(pMain));
-  int blocksAndEntries = G.number_of_nodes();
-
-  G.placeExitNodes();
-
-  EXPECT_EQ(G.number_of_nodes(), blocksAndEntries + 4);
-  for (KvCCfgProcedure* pProcedure : {pMain, pNone, pOne, pTwo}) {
-    KvCCfgNodeInfo* pExit = G.inf(pProcedure->getExitNode());
-    ASSERT_NE(pExit->isExitNode(), nullptr);
-    EXPECT_EQ(pExit->getProcedure(), pProcedure);
-    EXPECT_EQ(G.outdeg(pProcedure->getExitNode()), 0);
-  }
-  EXPECT_EQ(predecessors(pNone->getExitNode()), Nodes{});
-  EXPECT_EQ(predecessors(pOne->getExitNode()), Nodes{end});
-  EXPECT_EQ(predecessors(pTwo->getExitNode()), (Nodes{left, right}));
-}
-
 using LoopAroundMain = ProcedureTest;
-
-TEST_F(LoopAroundMain, EveryEndOfMainPassesTheLoopBlock) {
-  node fork = startWith(pMain, block(pMain, 1, true)), left = block(pMain), right = block(pMain);
-  onTrue(fork, left);
-  onFalse(fork, right);
-  G.placeExitNodes();
-
-  G.placeLoopAroundMain();
-
-  node exit = pMain->getExitNode();
-  ASSERT_EQ(G.indeg(exit), 1);
-  edge leave = G.first_in_edge(exit);
-  EXPECT_NE(G.inf(leave)->isFalseBranch(), nullptr);
-  node loop = G.source(leave);
-  EXPECT_EQ(predecessors(loop), (Nodes{left, right}));
-  EXPECT_EQ(successors(loop), (Nodes{fork, exit}));
-  EXPECT_NE(G.inf(G.first_adj_edge(loop))->isTrueBranch(), nullptr);
-  EXPECT_TRUE(condition(loop)->evaluate().isUndetermined());
-  EXPECT_EQ(procedureOf(loop), pMain);
-  expectInvariants(G);
-}
 
 // A loop block that nothing enters would have been a second node without in-edges in "#main".
 TEST_F(LoopAroundMain, RegressionMainThatNeverEndsGetsNoLoop) {
@@ -380,31 +219,6 @@ TEST_F(LoopAroundMain, RegressionMainThatNeverEndsGetsNoLoop) {
 }
 
 using CallGraph = ProcedureTest;
-
-TEST_F(CallGraph, OneEdgePerCallOfAnotherProcedure) {
-  KvCCfgProcedure *pA = procedure("a"), *pB = procedure("b");
-  node m = startWith(pMain, block(pMain)), x = startWith(pA, block(pA)), y = startWith(pB, block(pB));
-  call(m, "a");
-  call(m, "a");
-  call(x, "b");
-  call(y, "b");
-  call(y, "a");
-  node claimed = block(pMain);
-  plain(y, claimed);
-  ssaopt::graph fcg;
-  ssaopt::map<node, KvCCfgProcedure*> procedureOf;
-
-  KvCControlFlowGraphTestAccess::buildFunctionCallGraph(G, fcg, procedureOf);
-
-  std::vector<KvCCfgProcedure*> order;
-  for (node f : fcg.nodes()) order.push_back(procedureOf[f]);
-  EXPECT_EQ(order, (std::vector<KvCCfgProcedure*>{pMain, pA, pB}));
-  for (KvCCfgProcedure* pProcedure : order) EXPECT_EQ(procedureOf[pProcedure->getFcgNode()], pProcedure);
-  std::vector<std::pair<KvCCfgProcedure*, KvCCfgProcedure*>> calls;
-  for (edge e : fcg.edges()) calls.emplace_back(procedureOf[fcg.source(e)], procedureOf[fcg.target(e)]);
-  EXPECT_EQ(calls, (decltype(calls){{pMain, pA}, {pMain, pA}, {pA, pB}, {pB, pA}}));
-  EXPECT_EQ(G.inf(claimed)->getProcedure(), pB) << "ownership follows reachability";
-}
 
 TEST_F(CallGraph, CallsWithoutCallGraphNodeAreReportedAndLeftOut) {
   m_ReportsExpected = true;

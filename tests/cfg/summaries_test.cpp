@@ -1,5 +1,5 @@
 // Def/use summaries and interface statements where the textual format cannot go: calls that pass
-// fewer formals or none, calls inside a block, nodes without payload. Summaries of whole programs are
+// fewer formals or none, and nodes without payload. Summaries of whole programs are
 // tested as program texts with the client (ssa_construction_test.cpp).
 #include <gtest/gtest.h>
 
@@ -47,53 +47,11 @@ TEST_F(Summaries, GiveEveryRegisteredCallAnArgumentForEveryParameter) {
   EXPECT_TRUE(m_Log.empty());
 }
 
-TEST_F(Summaries, BringBackWhatACalleeDefinesRightAfterTheCall) {
-  KvCCfgProcedure *pP = procedure("P"), *pQ = procedure("Q");
-  node caller = startWith(
-      pMain, code(pMain, {assign(y, {&x}), call(pP), call(pQ), assign(u, {&a}), call(pP)}, reads({&c})));
-  node next = block(pMain);
-  onTrue(caller, next);
-  onFalse(caller, next);
-  startWith(pP, code(pP, {assign(a, {}), assign(b, {})}));
-  startWith(pQ, code(pQ, {assign(w, {&b})}));
-  placeInterfaceStatements();
-
-  Nodes chain{caller};
-  while (chain.size() < 3) chain.push_back(successors(chain.back()).at(0));
-  EXPECT_EQ(text(chain[0]), "y = x; call P; a = return(a); b = return(b)");
-  EXPECT_EQ(text(chain[1]), "call Q; w = return(w)");
-  EXPECT_EQ(text(chain[2]), "u = a; call P; a = return(a); b = return(b); if (c)");
-  EXPECT_EQ(successors(chain[2]), (Nodes{next, next}));
-  EXPECT_EQ(pP->getValueReturnStatements().size(), 4u);
-  EXPECT_EQ(pQ->getValueReturnStatements().size(), 1u);
-  EXPECT_TRUE(m_Log.empty());
-}
-
 TEST_F(Summaries, ReportANodeWithoutPayloadAndPassItBy) {
   startWith(pMain, code(pMain, {}));
   G.new_node();
   Access::placeValueReturnStatements(G);
   EXPECT_TRUE(m_Log.hasInternalError("KvCControlFlowGraph", 1684));
-}
-
-// The expression of parameter and value-return statements stands for its variables.
-TEST(InterfaceExpression, RenamesItsMembersAndTakesItsValueAndRangeFromThem) {
-  ssaopt::PoolMemController pool;
-  ssaopt::PoolMemController::Scope scope(&pool);
-  Var three("three"), five("five"), version("version");
-  for (auto [pVariable, number] : {std::pair{&three, 3.0}, std::pair{&five, 5.0}}) {
-    KvCCfgValue value(number);
-    pVariable->setVarValueAndAdjustCfgValue(value);
-  }
-  KvCCfgVariableExpression expression;
-  expression.addVariable(&three);
-  EXPECT_EQ(expression.evaluate().getValue(), 3.0);
-  expression.addVariable(&five);
-  EXPECT_TRUE(expression.evaluate().isUndetermined()) << "several members have no one value";
-  EXPECT_EQ(expression.getMinimum().getValue(), 3.0);
-  EXPECT_EQ(expression.getMaximum().getValue(), 5.0);
-  expression.replaceVariable(&three, &version);
-  EXPECT_EQ(expression.getUsedVariables(), (Variables{&five, &version}));
 }
 
 }  // namespace

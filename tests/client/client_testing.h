@@ -32,14 +32,7 @@ inline std::string readExample(const std::string& name) {
 class ClientTest : public ::testing::Test {
 protected:
   // Object indexes start at 0 in every test, so that generated names ("bb3", "#block_3") are stable.
-  ClientTest() {
-    KvCBasicBlock::boot();
-    KvCCfgStatement::boot();
-    KvCCfgVariable::boot();
-    KvCCfgExpression::boot();
-    KvCCfgEdgeInfo::boot();
-    KvCCfgProcedure::boot();
-  }
+  ClientTest() { ssaopt::client::restartObjectNumbering(); }
 
   // The program, or null with the test failed and the diagnostics shown.
   ssaopt::client::Program* load(const std::string& text) {
@@ -84,14 +77,6 @@ protected:
     for (KvCBasicBlock* pBlock : blocksOf(program))
       for (KvCCfgStatement* pStatement : pBlock->getStatementSeq())
         if (KvCCfgSFAssignment* pAssignment = pStatement->isSFAssignment()) return pAssignment;
-    return nullptr;
-  }
-
-  // The first branch condition of the program.
-  static KvCCfgSFExpression* firstCondition(ssaopt::client::Program& program) {
-    for (KvCBasicBlock* pBlock : blocksOf(program))
-      if (pBlock->getBranchCond() && pBlock->getBranchCond()->isSFExpression())
-        return pBlock->getBranchCond()->isSFExpression();
     return nullptr;
   }
 

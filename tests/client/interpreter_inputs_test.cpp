@@ -113,12 +113,4 @@ TEST(ListedStreams, GiveEachVariableItsValuesInOrderUntilTheyRunOut) {
   EXPECT_FALSE(inputs->next(c));
 }
 
-TEST(ListedStreams, RejectALineThatIsNotANameFollowedByNumbers) {
-  std::string error;
-  EXPECT_FALSE(ListedInputs::parse("a 1\nb 2 x\n", error));
-  EXPECT_EQ(error, "line 2: expected a variable name and numbers");
-  EXPECT_FALSE(ListedInputs::parse("5 6\n", error));
-  EXPECT_EQ(error, "line 1: expected a variable name and numbers");
-}
-
 }  // namespace

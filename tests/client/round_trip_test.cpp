@@ -60,65 +60,56 @@ TEST_F(RoundTrip, ExpressionsKeepOnlyTheParenthesesTheyNeed) {
             "}\n");
 }
 
-TEST_F(RoundTrip, BlocksSplitAtCallsReadBackAsWritten) {
+// Procedures follow the text, empty ones stay empty, and blocks split at calls read back as written.
+TEST_F(RoundTrip, ProceduresAndCallsReadBackAsWritten) {
   EXPECT_EQ(printTwice("var int16 x; var int16 p;\n"
+                       "proc z {}\n"
                        "proc f(p) { x = p; }\n"
                        "proc #main {\n"
                        "  x = 1;\n"
                        "  call f(x);\n"
                        "  call f(2);\n"
                        "  if x > 0 goto end else end;\n"
-                       "}\n"),
-            "var int16 x;\nvar int16 p;\n"
-            "\n"
-            "proc f(p) {\n"
-            "  x = p;\n"
-            "}\n"
-            "\n"
+                       "}\n"
+                       "proc a { goto end; }\n"),
+            "var int16 x;\nvar int16 p;\n\nproc z {\n}\n\nproc f(p) {\n  x = p;\n}\n\n"
             "proc #main {\n"
             "  x = 1;\n"
             "  call f(x);\n"
             "  call f(2);\n"
             "  if x > 0 goto end else end;\n"
-            "}\n");
+            "}\n\nproc a {\n}\n");
 }
 
-TEST_F(RoundTrip, JumpsAreWrittenOnlyWhereControlDoesNotFallThrough) {
+// Jumps are written only where control does not fall through; empty blocks that only lead to the end
+// read as the end.
+TEST_F(RoundTrip, JumpsAreWrittenOnlyWhereNeeded) {
   EXPECT_EQ(printTwice("var uint8 i;\n"
+                       "var bool b volatile;\n"
                        "proc #main {\n"
                        "  i = 0;\n"
                        "head:\n"
                        "  if i < 8 goto body else done;\n"
                        "done:\n"
+                       "  if b goto again else end;\n"
+                       "again:\n"
+                       "  goto last;\n"
+                       "last:\n"
                        "  goto end;\n"
                        "body:\n"
                        "  i = i + 1;\n"
                        "  goto head;\n"
                        "}\n"),
-            "var uint8 i;\n"
-            "\n"
+            "var uint8 i;\nvar bool b volatile;\n\n"
             "proc #main {\n"
             "  i = 0;\n"
             "head:\n"
-            "  if i < 8 goto body else end;\n"
+            "  if i < 8 goto body else done;\n"
+            "done:\n"
+            "  if b goto end else end;\n"
             "body:\n"
             "  i = i + 1;\n"
             "  goto head;\n"
-            "}\n");
-}
-
-TEST_F(RoundTrip, EmptyBlocksThatOnlyLeadToTheEndReadAsTheEnd) {
-  EXPECT_EQ(printTwice("var bool b volatile;\n"
-                       "proc #main {\n"
-                       "  if b goto again else end;\n"
-                       "again:\n"
-                       "  goto last;\n"
-                       "last:\n"
-                       "}\n"),
-            "var bool b volatile;\n"
-            "\n"
-            "proc #main {\n"
-            "  if b goto end else end;\n"
             "}\n");
 }
 
@@ -145,11 +136,6 @@ TEST_F(RoundTrip, OutlinedBlocksBecomeProceduresCalledWhereTheyWereReached) {
             "  count = count % 1000;\n"
             "  extern log_event uses(alarm, count);\n"
             "}\n");
-}
-
-TEST_F(RoundTrip, ProceduresFollowTheTextAndEmptyOnesStayEmpty) {
-  EXPECT_EQ(printTwice("proc z {}\nproc #main {}\nproc a { goto end; }\n"),
-            "\nproc z {\n}\n\nproc #main {\n}\n\nproc a {\n}\n");
 }
 
 }  // namespace

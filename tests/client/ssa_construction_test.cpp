@@ -85,36 +85,6 @@ TEST_F(SSAConstruction, ADiamondJoinsTheVersionsOfItsBranchesInInEdgeOrder) {
   EXPECT_EQ(main.find("phi", main.find("phi") + 1), std::string::npos);
 }
 
-TEST_F(SSAConstruction, ALoopHeaderJoinsTheVersionFromBeforeTheLoopAndTheBackEdgeVersion) {
-  std::string printed = transformed(
-      "var int16 i = 0;\n"
-      "var int16 n = 10;\n"
-      "proc #main {\n"
-      "  call count();\n"
-      "}\n"
-      "proc count {\n"
-      "  i = 0;\n"
-      "head:\n"
-      "  if i < n goto body else end;\n"
-      "body:\n"
-      "  i = i + 1;\n"
-      "  goto head;\n"
-      "}\n");
-  EXPECT_EQ(procedure(printed, "count"),
-            "proc count {\n"
-            "  i.4 = param(i.2 from #main:bb0);\n"
-            "  n.2 = param(n.1 from #main:bb0);\n"
-            "bb1:\n"
-            "  i.5 = 0;\n"
-            "head:\n"
-            "  i.6 = phi(i.5 from bb1, i.7 from body);\n"
-            "  if i.6 < n.2 goto body else end;\n"
-            "body:\n"
-            "  i.7 = i.6 + 1;\n"
-            "  goto head;\n"
-            "}\n");
-}
-
 // The formal p is written by the call, so the caller reads it back after the call.
 TEST_F(SSAConstruction, ACallPassesTheCallersVersionsAndTakesBackTheCalleesVersionsAtItsExit) {
   std::string printed = transformed(

@@ -2,6 +2,7 @@
 // the data type's value) and what its declaration guarantees about every value it holds.
 #include "client_testing.h"
 #include "ssaopt/client/numbers.h"
+#include "values/value_testing.h"
 
 namespace {
 
@@ -29,38 +30,30 @@ protected:
   }
 };
 
-TEST_F(Variables, SaturationComesFirstAndKeepsTheLimitExactly) {
-  KvCCfgSFVariable& speed = *declare("int16 speed scale(0.3) saturate(..100)");
-  EXPECT_EQ(stored(speed, 150), "100");
-  EXPECT_EQ(stored(speed, 50), "50.1");  // 167 steps of 0.3
+TEST_F(Variables, StoreSaturatedElseRepresentedElseCastValuesAndNoConstantInVolatilesOrArrays) {
+  const struct {
+    const char* declaration;
+    double given;
+    const char* held;
+  } cases[] = {
+      {"int16 speed scale(0.3) saturate(..100)", 150, "100"},  // the limit exactly
+      {"int16 speed scale(0.3) saturate(..100)", 50, "50.1"},  // 167 steps of 0.3
+      {"int16 temperature scale(0.5, -40)", 21.3, "21.5"},
+      {"int16 temperature scale(0.5, -40)", -40.2, "-40"},
+      {"bool b", 5, "1"},
+      {"int8 c", 300, "44"},
+      {"uint8 u", -1, "255"},
+      {"int16 i", 2.7, "2"},
+      {"float32 f", 0.1, "0.10000000149011612"},
+      {"int16 v volatile", 3, "*"},
+      {"int16 a[2]", 3, "*"},
+  };
+  for (const auto& c : cases) EXPECT_EQ(stored(*declare(c.declaration), c.given), c.held) << c.declaration;
 }
 
-TEST_F(Variables, ScaledValuesBecomeTheValueTheirStoredIntegerStandsFor) {
-  KvCCfgSFVariable& temperature = *declare("int16 temperature scale(0.5, -40)");
-  EXPECT_EQ(stored(temperature, 21.3), "21.5");
-  EXPECT_EQ(stored(temperature, -40.2), "-40");
-}
-
-TEST_F(Variables, UnscaledValuesAreCastToTheDataType) {
-  EXPECT_EQ(stored(*declare("bool b"), 5), "1");
-  EXPECT_EQ(stored(*declare("int8 c"), 300), "44");
-  EXPECT_EQ(stored(*declare("uint8 u"), -1), "255");
-  EXPECT_EQ(stored(*declare("int16 i"), 2.7), "2");
-  EXPECT_EQ(stored(*declare("float32 f"), 0.1), "0.10000000149011612");
-}
-
-TEST_F(Variables, VolatileAndArrayVariablesNeverHoldAConstant) {
-  EXPECT_EQ(stored(*declare("int16 v volatile"), 3), "*");
-  EXPECT_EQ(stored(*declare("int16 a[2]"), 3), "*");
-}
-
-TEST_F(Variables, TheInitialValueIsZeroUnlessDeclared) {
-  EXPECT_EQ(declare("int16 x")->getInitValue()->getValue(), 0.0);
-  EXPECT_TRUE(declare("int16 x")->getInitValue()->isConstant());
-  EXPECT_EQ(declare("int16 x = -7")->getInitValue()->getValue(), -7.0);
-}
-
-TEST_F(Variables, OnlyBooleansAreLogical) {
+TEST_F(Variables, TheInitialValueIsZeroUnlessDeclaredAndOnlyBooleansAreLogical) {
+  EXPECT_VALUE(*declare("int16 x")->getInitValue(), constant(0.0));
+  EXPECT_VALUE(*declare("int16 x = -7")->getInitValue(), constant(-7.0));
   EXPECT_TRUE(declare("bool b")->getDataType()->isLogicalType());
   EXPECT_FALSE(declare("uint8 u")->getDataType()->isLogicalType());
 }

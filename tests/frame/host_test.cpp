@@ -1,4 +1,4 @@
-// Host services: reports, the internal-information switch, strings, scalings, module control and the
+// Host services: reports, the internal-information switch, strings, module control and the
 // insertion-ordered map.
 #include <gtest/gtest.h>
 
@@ -60,27 +60,6 @@ TEST(HostString, NumbersConcatenationAndComparison) {
   EXPECT_GT(compare(BxCXString("b"), BxCXString("a")), 0);
 }
 
-TEST(ScaleTool, RepresentedValueRoundsOrTruncatesToTheGrid) {
-  KV_Scaling quarter(0.25, 0.0), offset(2.0, 1.0);
-  EXPECT_DOUBLE_EQ(KvCScaleTool::findRepresentedValue(1.3, &quarter), 1.25);
-  EXPECT_DOUBLE_EQ(KvCScaleTool::findRepresentedValue(1.4, &quarter), 1.5);
-  EXPECT_DOUBLE_EQ(KvCScaleTool::findRepresentedValueDontRound(1.4, &quarter), 1.25);
-  EXPECT_DOUBLE_EQ(KvCScaleTool::findRepresentedValue(4.2, &offset), 5.0);
-  EXPECT_DOUBLE_EQ(KvCScaleTool::findRepresentedValue(-1.3, &quarter), -1.25);
-  EXPECT_DOUBLE_EQ(KvCScaleTool::findRepresentedValue(3.7, nullptr), 3.7);
-}
-
-TEST(DataTypes, ElementaryTypesAnswerTheirQueries) {
-  EXPECT_TRUE(KV_DataType::boolean()->isBool());
-  EXPECT_TRUE(KV_DataType::boolean()->isLogicalType());
-  const KV_BaseType* boolBase = KV_DataType::boolean()->getBaseType();
-  ASSERT_NE(boolBase, nullptr);
-  EXPECT_FALSE(boolBase->isUInt8() || boolBase->isInt8() || boolBase->isInt32() || boolBase->isFloat64());
-  EXPECT_TRUE(KV_DataType::uint16()->getBaseType()->isUInt16());
-  EXPECT_TRUE(KV_DataType::float32()->getBaseType()->isFloat32());
-  EXPECT_FALSE(KV_DataType::int8()->isBool());
-}
-
 TEST(ModuleControl, BootAndShutdownAlwaysSucceedAndLeaveCountersAlone) {
   std::uint32_t counter = 0;
   EXPECT_EQ(drawIndex(counter), 0u);
@@ -116,19 +95,4 @@ TEST(Containers, MapIteratesInInsertionOrderAndCreatesOnAccess) {
   EXPECT_EQ(m[&a], 1);
   EXPECT_EQ(*copy.lookup(&a), 10);
   EXPECT_EQ(copy.size(), 3u);
-}
-
-TEST(Containers, StackAndSetHelpers) {
-  stack<int> s;
-  s.push(1);
-  s.push(2);
-  EXPECT_EQ(s.top(), 2);
-  EXPECT_EQ(s.pop(), 2);
-  EXPECT_EQ(s.size(), 1u);
-  set<int> x{1, 2, 3}, y{2, 3, 4};
-  set<int> both = x;
-  intersectWith(both, y);
-  EXPECT_EQ(both, (set<int>{2, 3}));
-  insertAll(x, y);
-  EXPECT_EQ(x, (set<int>{1, 2, 3, 4}));
 }

@@ -1,4 +1,4 @@
-// Basic blocks: deleting, splitting and cloning, and the cached list of assigned variables.
+// Basic blocks: deleting, splitting and cloning.
 #include "doubles.h"
 #include "ssaopt/ir/procedure.h"
 
@@ -8,7 +8,6 @@ using irtest::TestStatement;
 using irtest::TestVariable;
 using irtest::Variables;
 using Statements = std::vector<KvCCfgStatement*>;
-using VariableList = std::vector<KvCCfgVariable*>;
 
 // Statements s[0..4] behind one phi function, ending in a condition.
 class FiveStatementBlock : public ::testing::Test {
@@ -29,19 +28,6 @@ protected:
   KvCPhiFunction* phi = new KvCPhiFunction(&x, 2);
   KvCCfgStatement* s[5];
 };
-
-TEST_F(FiveStatementBlock, SplittingMovesTheTailAndTheConditionButTheBlockKeepsItsPhiFunctions) {
-  KvCBasicBlock* pTail = block.splitAtStatement(s[2]);
-  EXPECT_EQ(statementsOf(block), (Statements{s[0], s[1]}));
-  EXPECT_EQ(block.getBranchCond(), nullptr);
-  EXPECT_EQ(block.getPhiFunctions().size(), 1u);
-  EXPECT_EQ(statementsOf(*pTail), (Statements{s[2], s[3], s[4]}));
-  EXPECT_EQ(pTail->getBranchCond(), &cond);
-  EXPECT_TRUE(pTail->getPhiFunctions().empty());
-  EXPECT_EQ(pTail->getProcedure(), &procedure);
-  irtest::deleteContents(*pTail);
-  delete pTail;
-}
 
 TEST_F(FiveStatementBlock, SplittingAtTheFirstOrAtAForeignStatementChangesNothing) {
   ssaopt::ReportLog log;
@@ -76,21 +62,6 @@ TEST_F(FiveStatementBlock, DeletingRemovesFromTheRightListAndReportsStrangers) {
   EXPECT_EQ(fate.removed, 1);
 }
 
-TEST(BlockSplit, AtTheConditionOnlyWhenStatementsPrecedeIt) {
-  TestExpression first, second;
-  TestStatement statement;
-  KvCBasicBlock block;
-  block.appendBranch(&first);
-  block.appendBranch(&second);
-  EXPECT_EQ(block.splitAtCondition(), &block);
-  block.append(&statement);
-  KvCBasicBlock* pCondition = block.splitAtCondition();
-  EXPECT_EQ(pCondition->getBranchCond(), &second);
-  EXPECT_EQ(block.getBranchCond(), nullptr);
-  EXPECT_EQ(block.isStatement(), &statement);
-  delete pCondition;
-}
-
 TEST(BlockClone, OnlyASingleStatementOrPhiFunctionThatClonesGivesABlock) {
   TestVariable x;
   TestExpression cond;
@@ -117,19 +88,4 @@ TEST(BlockClone, OnlyASingleStatementOrPhiFunctionThatClonesGivesABlock) {
     irtest::deleteContents(*pBlock);
   delete pStatementCopy;
   delete pPhiCopy;
-}
-
-TEST(BlockSummary, AssignedVariablesAreCachedAtTheFirstRequestThatFindsThemEmpty) {
-  TestVariable x, y, z;
-  KvCPhiFunction phi(&x, 1);
-  TestStatement defineY({&y}), defineXZ({&x, &z});
-  KvCBasicBlock block;
-  EXPECT_TRUE(block.getAssignedVariables().empty());
-  block.append(&phi);
-  block.append(&defineY);
-  EXPECT_EQ(irtest::items(block.getAssignedVariables()), (VariableList{&x, &y}));
-  block.append(&defineXZ);
-  EXPECT_EQ(irtest::items(block.getAssignedVariables()), (VariableList{&x, &y}));
-  block.recomputeAssignedVariables();
-  EXPECT_EQ(irtest::items(block.getAssignedVariables()), (VariableList{&x, &y, &x, &z}));
 }

@@ -328,8 +328,18 @@ private:
   // ---- Sparse conditional constant propagation (constant_propagation.cpp) ----------------------
 
   void buildVarUses();
+  void startPropagationRecord();
+  void visitProcedure(int procedure, ssaopt::list<ssaopt::edge>& cfgWorkList,
+                      ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
   void propagateFrom(ssaopt::node entry, ssaopt::list<ssaopt::edge>& cfgWorkList,
                      ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
+  // A definition at `v` now holds another value or range: its procedure and the procedures of its
+  // uses are visited again in the next pass.
+  void unsettleDefinitionAt(ssaopt::node v);
+  void unsettleProcedureOf(ssaopt::node v);
+  // Dead-code elimination is about to delete `n`: its procedure changes, and so does every procedure
+  // that a call in it passes arguments to.
+  void unsettleProceduresOfDeadBlock(ssaopt::node n);
   void initSparseConditionalConstant(ssaopt::node entry, ssaopt::list<ssaopt::edge>& cfgWorkList,
                                      ssaopt::list<ssaopt::edge>& ssaWorkList);
   void flowStep(ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
@@ -378,6 +388,22 @@ private:
   // Per node, how many in-edges carry the executable flag. The flow step asks at every edge that
   // becomes executable; counting at a join with many in-edges each time would be quadratic.
   ssaopt::node_array<int> m_ExecutableInEdges;
+
+  // What propagation keeps between its passes so that a pass visits again only the procedures whose
+  // visit could come out differently: a visit is a function of the procedure's own values, ranges and
+  // blocks and of the values and ranges it reads through SSA edges from other procedures, so a
+  // procedure whose last visit changed none of its definitions, and none of whose inputs changed
+  // since, would repeat that visit exactly. Procedures are numbered by their position in the table.
+  struct PropagationRecord {
+    ssaopt::node_array<int> procedureOf;  // -1 for a node that no entry reaches
+    ssaopt::array<bool> unsettled;        // per procedure: to be visited in the next pass
+    // Per procedure, the nodes its last visit marked visited: a visit clears its own marks only, so
+    // that the marks of the procedures a pass passes over stay for dead-code elimination.
+    ssaopt::array<ssaopt::array<ssaopt::node>> visitedBy;
+    ssaopt::array<ssaopt::node> entries;  // per procedure
+    int current = -1;                     // the procedure being visited
+  };
+  PropagationRecord m_Propagation;
 
   // ---- Dead-code elimination (dead_code.cpp) ---------------------------------------------------
 

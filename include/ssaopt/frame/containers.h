@@ -22,8 +22,13 @@ namespace ssaopt {
 template <class T>
 using list = std::list<T, ModuleAllocator<T>>;
 
+// The order of a set where none is given. Classes whose sets must not iterate by address specialise
+// it (before any set of theirs is used).
+template <class T>
+struct set_order : std::less<T> {};
+
 // Balanced search tree, ascending order.
-template <class T, class Less = std::less<T>>
+template <class T, class Less = set_order<T>>
 using set = std::set<T, Less, ModuleAllocator<T>>;
 
 // Indexed array.
@@ -32,7 +37,8 @@ using array = std::vector<T, ModuleAllocator<T>>;
 
 // Ordered map keyed by host strings, ascending by string comparison.
 template <class V>
-using string_map = std::map<BxCXString, V, std::less<BxCXString>, ModuleAllocator<std::pair<const BxCXString, V>>>;
+using string_map =
+    std::map<BxCXString, V, std::less<BxCXString>, ModuleAllocator<std::pair<const BxCXString, V>>>;
 
 // Inserts every element of `from` into `into` (set union in place).
 template <class Set>
@@ -43,8 +49,7 @@ void insertAll(Set& into, const Set& from) {
 // Keeps only the elements of `into` that are also in `other` (set intersection in place).
 template <class Set>
 void intersectWith(Set& into, const Set& other) {
-  for (auto it = into.begin(); it != into.end();)
-    it = other.count(*it) ? std::next(it) : into.erase(it);
+  for (auto it = into.begin(); it != into.end();) it = other.count(*it) ? std::next(it) : into.erase(it);
 }
 
 // Stack on a growable array.
@@ -134,7 +139,8 @@ private:
   }
 
   Entries m_Entries;
-  std::unordered_map<K, iterator, Hash, std::equal_to<K>, ModuleAllocator<std::pair<const K, iterator>>> m_Index;
+  std::unordered_map<K, iterator, Hash, std::equal_to<K>, ModuleAllocator<std::pair<const K, iterator>>>
+      m_Index;
 };
 
 }  // namespace ssaopt

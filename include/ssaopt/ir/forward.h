@@ -37,3 +37,19 @@ class KvCCfgSFVariable;
 class KvCCfgSFExpression;
 class KvCCfgSFAssignment;
 class KvCCfgSFProcedureCall;
+
+namespace ssaopt {
+
+template <class T>
+struct set_order;
+
+// Sets of variables iterate in creation order (by object index), not by address: the library adds
+// statements once per variable of a set (initialisations, value returns, output statements, phi
+// functions), and their order must not depend on where the allocator put the variables, which
+// differs between runs and after memory is reused.
+template <>
+struct set_order<KvCCfgVariable*> {
+  bool operator()(const KvCCfgVariable* a, const KvCCfgVariable* b) const;
+};
+
+}  // namespace ssaopt

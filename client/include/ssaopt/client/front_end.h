@@ -43,4 +43,10 @@ LoadResult loadProgram(std::string text);
 // Reads the file first; an unreadable file is an error at line 0.
 LoadResult loadProgramFile(const std::string& path);
 
+// Starts the numbering of the library's objects again from 0, so that the program loaded next has the
+// block names (bb12, ...) and orders that a fresh process gives it. The library never does this by
+// itself; a client that loads one program after another and compares their text across processes
+// calls it between them.
+void restartObjectNumbering();
+
 }  // namespace ssaopt::client

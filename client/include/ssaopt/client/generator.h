@@ -1,8 +1,9 @@
 // Random programs in the textual format, for differential testing of the whole pipeline: several
-// procedures with formals and calls (never recursive), nested if/else, loops bounded by a counter,
-// every data type with scaling and saturation, volatile inputs, arrays, external calls, conditions
-// that constants decide and assignments that both branches of an if/else begin with. Every program
-// the generator writes loads without errors and reaches the end of every procedure.
+// procedures with formals and calls (nested, and recursive, directly or mutually, under a depth
+// bound), nested if/else, loops bounded by a counter, outlined blocks, every data type with scaling
+// and saturation, volatile inputs, arrays with constant and variable indexes, external calls,
+// conditions that constants decide and assignments that both branches of an if/else begin with.
+// Every program the generator writes loads without errors and reaches the end of every procedure.
 #pragma once
 
 #include <cstdint>

@@ -1,0 +1,105 @@
+// The parts of the C emitter: C names and storage of the program's variables, and the C text of
+// expressions and statements. The emitter (c_emitter.cpp) arranges them into functions.
+#pragma once
+
+#include <cstdint>
+#include <set>
+#include <string>
+#include <unordered_map>
+#include <vector>
+
+#include "ssaopt/client/program.h"
+
+namespace ssaopt::client::detail {
+
+// The fixed helper functions and hook declarations every emitted unit starts with.
+const char* cRuntimeText();
+
+// A C identifier of the program's own that C does not reserve and that the emitter's names
+// (ssa_..., proc_..., sys_...) cannot take.
+bool isFreeCIdentifier(const std::string& name);
+
+// How a variable is held in C.
+struct CVariable {
+  const KvCCfgSFVariable* pVariable = nullptr;
+  std::string name;  // the C identifier
+  std::string type;  // the C type of the variable or of each element
+  bool heldAsDouble = false;
+  bool hasStoreHelper = false;  // saturated or scaled: stores go through ssa_store_NAME
+  bool stored = false;          // written, read or observed: the emitted code needs the global
+  bool readsInput = false;      // volatile and read: the emitted code calls its input hook
+  bool refilled = false;        // an array that an external call gives new values from its stream
+};
+
+class CVariables {
+public:
+  explicit CVariables(const Program& program);
+
+  // The variable that `pVariable` or the SSA version `pVariable` stands for.
+  CVariable& of(KvCCfgVariable* pVariable);
+  std::vector<CVariable>& all() { return m_Variables; }
+
+  // The C text that reads the variable as a double, that reads the next value of its input stream,
+  // and that converts `value` as assigning to it stores it.
+  std::string readText(CVariable& variable);
+  std::string inputText(CVariable& variable);
+  std::string storeText(CVariable& variable, const std::string& value);
+  // The C constant of what assigning `number` to the variable stores.
+  std::string storedConstant(CVariable& variable, double number);
+  // Whether the C code calls the variable's input hook.
+  static bool hasInputHook(const CVariable& variable) { return variable.readsInput || variable.refilled; }
+
+  // Declarations, per-variable helpers (stores, element access, observation, refill) of the used
+  // variables, and the declarations of the input hooks.
+  std::string declarations() const;
+  std::string inputHook(const CVariable& variable) const { return "ssa_input_" + variable.name; }
+
+private:
+  std::vector<CVariable> m_Variables;
+  std::unordered_map<const KvCCfgVariable*, std::size_t> m_Index;
+};
+
+// A piece of C that the interpreter cannot run; the emitted code calls ssa_fault there.
+struct Unemittable {
+  std::string message;
+};
+
+// Statements as C lines, each computed value sequenced as the interpreter sequences it.
+class CStatements {
+public:
+  explicit CStatements(CVariables& variables) : m_Variables(variables) {}
+
+  // A parameter statement that stands in a block: in SSA form, calls pass only these arguments.
+  void placeParameter(const KvCCfgParamStatement* pParam) { m_PlacedParameters.insert(pParam); }
+
+  // The C lines of one statement (none for those that generate no code); throws Unemittable.
+  std::vector<std::string> statement(KvCCfgStatement& statement, const KvCControlFlowGraph& graph,
+                                     bool argumentsAtCalls);
+  // "if (...) JUMP" for a branch condition; throws Unemittable.
+  std::vector<std::string> branch(KvCCfgExpression* pCondition, const std::string& jump);
+
+  static std::string procedureName(const std::string& name);
+
+private:
+  struct Code {
+    std::vector<std::string> prelude;  // declarations of temporaries, in evaluation order
+    std::string text;
+  };
+
+  Code expression(KvCCfgExpression* pExpression, bool condition);
+  Code terms(const KvCCfgSFExpression& expression, bool condition);
+  std::vector<std::string> assignment(KvCCfgAssignment& assignment);
+  std::vector<std::string> call(KvCCfgProcedureCall& call, const KvCControlFlowGraph& graph,
+                                bool argumentsAtCalls);
+  std::vector<std::string> externCall(KvCCfgExternCall& call);
+  std::string temporary(const std::string& kind);
+
+  CVariables& m_Variables;
+  std::set<const KvCCfgParamStatement*> m_PlacedParameters;
+  int m_Temporaries = 0;
+};
+
+// Wraps lines that declare temporaries into a block of their own.
+std::vector<std::string> scoped(std::vector<std::string> prelude, const std::vector<std::string>& lines);
+
+}  // namespace ssaopt::client::detail

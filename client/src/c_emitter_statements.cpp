@@ -1,0 +1,295 @@
+// The C text of expressions and statements. Operators other than + and - go through the helpers of
+// the runtime text, which compute as the value arithmetic does. C leaves the order in which operands
+// are evaluated open, so an expression that reads inputs more than once reads them first, into
+// temporaries in the interpreter's (postfix) order.
+#include <algorithm>
+#include <cmath>
+#include <optional>
+#include <utility>
+
+#include "c_emitter_code.h"
+#include "ssaopt/client/numbers.h"
+#include "ssaopt/client/statements.h"
+#include "ssaopt/client/variable.h"
+#include "ssaopt/ir/procedure.h"
+#include "ssaopt/ir/statement.h"
+#include "ssaopt/ir/variable_expression.h"
+
+namespace ssaopt::client::detail {
+
+namespace {
+
+constexpr int kInfixAdditive = 70;
+constexpr int kInfixComparison = 50;
+
+struct Piece {
+  std::string text;
+  int precedence;
+  bool readsTemporary = false;  // an input read first into a temporary
+};
+
+// The runtime helper of each operator that C's own operators would not compute alike.
+const char* helperOf(TermOp op) {
+  static const std::pair<TermOp, const char*> kHelpers[] = {
+      {TermOp::Not, "ssa_not"},         {TermOp::Complement, "ssa_compl"}, {TermOp::Abs, "ssa_abs"},
+      {TermOp::Sgn, "ssa_sgn"},         {TermOp::Multiply, "ssa_mul"},     {TermOp::Divide, "ssa_div"},
+      {TermOp::Remainder, "ssa_rem"},   {TermOp::ShiftLeft, "ssa_shl"},    {TermOp::ShiftRight, "ssa_shr"},
+      {TermOp::Less, "ssa_lt"},         {TermOp::LessEqual, "ssa_le"},     {TermOp::Greater, "ssa_gt"},
+      {TermOp::GreaterEqual, "ssa_ge"}, {TermOp::Equal, "ssa_eq"},         {TermOp::NotEqual, "ssa_ne"},
+      {TermOp::BitAnd, "ssa_bitand"},   {TermOp::BitXor, "ssa_bitxor"},    {TermOp::BitOr, "ssa_bitor"},
+      {TermOp::LogicalAnd, "ssa_and"},  {TermOp::LogicalOr, "ssa_or"}};
+  for (const auto& [helped, name] : kHelpers)
+    if (helped == op) return name;
+  return "";
+}
+
+bool isComparison(TermOp op) {
+  return op == TermOp::Less || op == TermOp::LessEqual || op == TermOp::Greater ||
+         op == TermOp::GreaterEqual || op == TermOp::Equal || op == TermOp::NotEqual;
+}
+
+std::string parenthesised(const Piece& piece, bool needed) {
+  return needed ? "(" + piece.text + ")" : piece.text;
+}
+
+Piece literalPiece(double number) {
+  std::string text;
+  if (std::isnan(number))
+    text = "SSA_NAN";
+  else if (std::isinf(number))
+    text = number < 0 ? "-SSA_INF" : "SSA_INF";
+  else
+    text = formatNumber(number);
+  if (text.find_first_of(".eAN") == std::string::npos) text += ".0";
+  return Piece{text, text[0] == '-' ? kUnaryPrecedence : kAtomPrecedence};
+}
+
+Piece operatorPiece(TermOp op, const Piece* operands, bool topComparison) {
+  if (op == TermOp::Negate)
+    return Piece{"-" + parenthesised(operands[0],
+                                     operands[0].precedence < kUnaryPrecedence || operands[0].text[0] == '-'),
+                 kUnaryPrecedence};
+  if (op == TermOp::Add || op == TermOp::Subtract || topComparison) {
+    int precedence = topComparison ? kInfixComparison : kInfixAdditive;
+    return Piece{parenthesised(operands[0], operands[0].precedence < precedence) + " " + spellingOf(op) +
+                     " " + parenthesised(operands[1], operands[1].precedence <= precedence),
+                 precedence};
+  }
+  std::string text = std::string(helperOf(op)) + "(" + operands[0].text;
+  if (arityOf(op) == 2) text += ", " + operands[1].text;
+  return Piece{text + ")", kAtomPrecedence};
+}
+
+bool readsInput(const KvCCfgSFExpression::Term& term) {
+  return (term.op == TermOp::Variable || term.op == TermOp::ElementRead) && term.pVariable->isVolatile();
+}
+
+// The number an expression of a single literal stands for, which a store can convert in advance.
+std::optional<double> constantOf(KvCCfgExpression* pExpression) {
+  KvCCfgSFExpression* pTerms = pExpression ? pExpression->isSFExpression() : nullptr;
+  if (pTerms && pTerms->getTerms().size() == 1 && pTerms->getTerms()[0].op == TermOp::Literal)
+    return pTerms->getTerms()[0].number;
+  KvCCfgValue value = pExpression && !pTerms ? pExpression->evaluate() : KvCCfgValue();
+  if (dynamic_cast<KvCCfgValueExpression*>(pExpression) && value.isConstant()) return value.getValue();
+  return std::nullopt;
+}
+
+std::string quoted(const std::string& name) { return "'" + name + "'"; }
+
+std::string nameOf(KvCCfgVariable* pVariable) {
+  KvCCfgSFVariable* pNamed = originalOf(pVariable)->isSFVariable();
+  return pNamed ? quoted(pNamed->getName()) : "a variable of no program";
+}
+
+}  // namespace
+
+std::vector<std::string> scoped(std::vector<std::string> prelude, const std::vector<std::string>& lines) {
+  if (prelude.empty()) return lines;
+  std::vector<std::string> block{"{"};
+  for (std::string& line : prelude) block.push_back("  " + line);
+  for (const std::string& line : lines) block.push_back("  " + line);
+  block.push_back("}");
+  return block;
+}
+
+std::string CStatements::procedureName(const std::string& name) {
+  return name.rfind('#', 0) == 0 ? "sys_" + name.substr(1) : "proc_" + name;
+}
+
+std::string CStatements::temporary(const std::string& kind) {
+  return "ssa_" + kind + std::to_string(++m_Temporaries);
+}
+
+CStatements::Code CStatements::expression(KvCCfgExpression* pExpression, bool condition) {
+  if (!pExpression) throw Unemittable{"an expression is missing"};
+  if (KvCCfgSFExpression* pTerms = pExpression->isSFExpression()) return terms(*pTerms, condition);
+  if (auto* pMembers = dynamic_cast<KvCCfgVariableExpression*>(pExpression)) {
+    ssaopt::set<KvCCfgVariable*> members = pMembers->getUsedVariables();
+    if (members.size() != 1)
+      throw Unemittable{"a variable expression holds " + std::to_string(members.size()) + " variables"};
+    CVariable& variable = m_Variables.of(*members.begin());
+    if (variable.pVariable->isArray())
+      throw Unemittable{"passes the whole array " + quoted(variable.pVariable->getName())};
+    if (variable.pVariable->isVolatile()) return Code{{}, m_Variables.inputText(variable)};
+    return Code{{}, m_Variables.readText(variable)};
+  }
+  KvCCfgValue value = pExpression->evaluate();
+  if (!dynamic_cast<KvCCfgValueExpression*>(pExpression) || !value.isConstant())
+    throw Unemittable{"an expression has no value"};
+  return Code{{}, literalPiece(value.getValue()).text};
+}
+
+CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool condition) {
+  const KvCCfgSFExpression::Terms& terms = expression.getTerms();
+  if (terms.empty()) throw Unemittable{"an expression without terms"};
+  bool readsFirst = std::count_if(terms.begin(), terms.end(), readsInput) > 1;
+  Code code;
+  std::vector<Piece> stack;
+  for (std::size_t i = 0; i < terms.size(); ++i) {
+    const KvCCfgSFExpression::Term& term = terms[i];
+    std::size_t arity = static_cast<std::size_t>(arityOf(term.op));
+    const Piece* operands = stack.data() + (stack.size() - arity);
+    Piece result;
+    bool readsTemporary =
+        std::any_of(operands, operands + arity, [](const Piece& piece) { return piece.readsTemporary; });
+    if (term.op == TermOp::Literal) {
+      result = literalPiece(term.number);
+    } else if (namesVariable(term.op)) {
+      CVariable& variable = m_Variables.of(term.pVariable);
+      if (variable.pVariable->isArray() != (term.op != TermOp::Variable))
+        throw Unemittable{"uses " + nameOf(term.pVariable) +
+                          (variable.pVariable->isArray() ? " without" : " with") + " an index"};
+      if (readsInput(term)) {
+        // An element of an input array reads the stream whatever its index, which is only computed.
+        if (term.op == TermOp::ElementRead && readsTemporary)
+          code.prelude.push_back("(void)(" + operands[0].text + ");");
+        result = Piece{m_Variables.inputText(variable), kAtomPrecedence};
+        if (readsFirst) {
+          std::string name = temporary("in");
+          code.prelude.push_back("double " + name + " = " + result.text + ";");
+          result = Piece{name, kAtomPrecedence, true};
+        }
+      } else if (term.op == TermOp::Variable) {
+        std::string text = m_Variables.readText(variable);
+        result = Piece{text, text[0] == '(' ? kUnaryPrecedence : kAtomPrecedence};
+      } else if (term.op == TermOp::ElementRead) {
+        variable.stored = true;
+        result = Piece{"ssa_read_" + variable.name + "(" + operands[0].text + ")", kAtomPrecedence};
+      } else {
+        variable.stored = true;
+        result =
+            Piece{"ssa_write_" + variable.name + "(" + operands[0].text + ", " + operands[1].text + ")", 0};
+      }
+    } else {
+      result = operatorPiece(term.op, operands, condition && i + 1 == terms.size() && isComparison(term.op));
+    }
+    result.readsTemporary = result.readsTemporary || (readsTemporary && !readsInput(term));
+    stack.resize(stack.size() - arity);
+    stack.push_back(std::move(result));
+  }
+  code.text = stack.back().text;
+  return code;
+}
+
+std::vector<std::string> CStatements::statement(KvCCfgStatement& statement, const KvCControlFlowGraph& graph,
+                                                bool argumentsAtCalls) {
+  m_Temporaries = 0;
+  if (statement.getIsVirtual() || statement.isPhiFunction() || statement.isValueReturnStatement() ||
+      statement.isOutputStatement() || statement.isParamStatement())
+    return {};
+  if (KvCCfgAssignment* pAssignment = statement.isAssignment()) return assignment(*pAssignment);
+  if (KvCCfgProcedureCall* pCall = statement.isProcedureCall()) return call(*pCall, graph, argumentsAtCalls);
+  if (KvCCfgExternCall* pExtern = statement.isExternCall()) return externCall(*pExtern);
+  throw Unemittable{"a statement of no known kind"};
+}
+
+std::vector<std::string> CStatements::branch(KvCCfgExpression* pCondition, const std::string& jump) {
+  m_Temporaries = 0;
+  Code condition = expression(pCondition, true);
+  return scoped(condition.prelude, {"if (" + condition.text + ") " + jump});
+}
+
+std::vector<std::string> CStatements::assignment(KvCCfgAssignment& assignment) {
+  KvCCfgSFExpression* pTerms = assignment.getRHS() ? assignment.getRHS()->isSFExpression() : nullptr;
+  if (pTerms && pTerms->isElementWrite()) {
+    Code write = terms(*pTerms, false);
+    return scoped(write.prelude, {write.text + ";"});
+  }
+  if (!assignment.getLHS()) throw Unemittable{"an assignment without left-hand side"};
+  CVariable& variable = m_Variables.of(assignment.getLHS());
+  if (std::optional<double> number = constantOf(assignment.getRHS());
+      number && !variable.pVariable->isArray())
+    return {variable.name + " = " + m_Variables.storedConstant(variable, *number) + ";"};
+  Code value = expression(assignment.getRHS(), false);
+  if (variable.pVariable->isArray()) {
+    variable.stored = true;
+    return scoped(value.prelude, {"ssa_fill_" + variable.name + "(" + value.text + ");"});
+  }
+  return scoped(value.prelude, {variable.name + " = " + m_Variables.storeText(variable, value.text) + ";"});
+}
+
+// The arguments go to the formal parameters, all evaluated before any is stored, then the procedure
+// runs. Before the SSA transformation the call holds them; afterwards the parameter statements that
+// stand in the procedure's blocks do, and one passing a variable to itself changes nothing.
+std::vector<std::string> CStatements::call(KvCCfgProcedureCall& call, const KvCControlFlowGraph& graph,
+                                           bool argumentsAtCalls) {
+  KvCCfgProcedure* pCallee = graph.findProcedure(call.getName());
+  std::string callee = call.getName().cstring();
+  if (!pCallee) throw Unemittable{"calls '" + callee + "', no procedure of the graph"};
+  std::vector<std::pair<CVariable*, Code>> arguments;
+  for (KvCCfgParamStatement* pParam : pCallee->getParamStatements()) {
+    if (!argumentsAtCalls && !m_PlacedParameters.count(pParam)) continue;
+    KvCCfgExpression* pArgument = pParam->getArgument(&call);
+    if (!pArgument && argumentsAtCalls)
+      throw Unemittable{"the call of '" + callee + "' passes nothing for " + nameOf(pParam->getVariable())};
+    if (!pArgument)
+      return {"ssa_fault(\"the parameter statement of " + nameOf(pParam->getVariable()) +
+              " has no argument for the call that runs it\");"};
+    CVariable& formal = m_Variables.of(pParam->getVariable());
+    auto* pMembers = dynamic_cast<KvCCfgVariableExpression*>(pArgument);
+    if (!argumentsAtCalls && pMembers && pMembers->getUsedVariables().size() == 1 &&
+        &m_Variables.of(*pMembers->getUsedVariables().begin()) == &formal)
+      continue;
+    arguments.emplace_back(&formal, expression(pArgument, false));
+  }
+  std::vector<std::string> prelude, lines;
+  for (auto& [pFormal, value] : arguments) {
+    prelude.insert(prelude.end(), value.prelude.begin(), value.prelude.end());
+    std::string text = value.text;
+    if (arguments.size() > 1) {
+      text = temporary("arg");
+      prelude.push_back("double " + text + " = " + value.text + ";");
+    }
+    lines.push_back(pFormal->name + " = " + m_Variables.storeText(*pFormal, text) + ";");
+  }
+  lines.push_back(procedureName(callee) + "();");
+  return scoped(prelude, lines);
+}
+
+std::vector<std::string> CStatements::externCall(KvCCfgExternCall& call) {
+  auto inDeclarationOrder = [this](const auto& variables) {
+    std::vector<CVariable*> sorted;
+    for (KvCCfgVariable* pVariable : variables) sorted.push_back(&m_Variables.of(pVariable));
+    std::sort(sorted.begin(), sorted.end());
+    sorted.erase(std::unique(sorted.begin(), sorted.end()), sorted.end());
+    return sorted;
+  };
+  std::vector<std::string> lines{"ssa_extern_begin(\"" + std::string(externCallName(call).cstring()) +
+                                 "\");"};
+  for (CVariable* pUsed : inDeclarationOrder(call.getUsedVariables())) {
+    pUsed->stored = true;
+    lines.push_back(pUsed->pVariable->isArray() ? "ssa_observe_" + pUsed->name + "();"
+                                                : "ssa_value(\"" + pUsed->pVariable->getName() + "\", " +
+                                                      m_Variables.readText(*pUsed) + ");");
+  }
+  lines.push_back("ssa_extern_end();");
+  for (CVariable* pModified : inDeclarationOrder(call.getModifiableVariables()))
+    if (pModified->pVariable->isArray() && !pModified->pVariable->isVolatile()) {
+      pModified->refilled = true;
+      pModified->stored = true;
+      lines.push_back("ssa_refill_" + pModified->name + "();");
+    }
+  return lines;
+}
+
+}  // namespace ssaopt::client::detail

@@ -1,0 +1,271 @@
+// The program's variables in C: their identifiers, the C type each is held in, and the helpers that
+// store, index, observe and refill them as the interpreter does.
+#include <cmath>
+#include <set>
+#include <sstream>
+
+#include "c_emitter_code.h"
+#include "ssaopt/client/data_types.h"
+#include "ssaopt/client/interpreter.h"
+#include "ssaopt/client/numbers.h"
+#include "ssaopt/values/arithmetic.h"
+
+namespace ssaopt::client::detail {
+
+namespace {
+
+const std::set<std::string> kCKeywords = {
+    "auto",     "break",  "case",   "char",     "const",      "continue", "default",  "do",
+    "double",   "else",   "enum",   "extern",   "float",      "for",      "goto",     "if",
+    "inline",   "int",    "long",   "register", "restrict",   "return",   "short",    "signed",
+    "sizeof",   "static", "struct", "switch",   "typedef",    "union",    "unsigned", "void",
+    "volatile", "while",  "_Bool",  "_Complex", "_Imaginary", "main"};
+
+bool startsWith(const std::string& text, const char* prefix) { return text.rfind(prefix, 0) == 0; }
+
+bool endsWith(const std::string& text, const std::string& suffix) {
+  return text.size() >= suffix.size() &&
+         text.compare(text.size() - suffix.size(), suffix.size(), suffix) == 0;
+}
+
+// <stdint.h> declares types ending in _t and macros such as INT16_MAX and UINT8_C.
+bool isStdintName(const std::string& name) {
+  return endsWith(name, "_t") || startsWith(name, "INT") || startsWith(name, "UINT") ||
+         endsWith(name, "_MIN") || endsWith(name, "_MAX") || endsWith(name, "_C");
+}
+
+const char* cTypeOf(const KV_DataType* pType) {
+  if (pType == KV_DataType::boolean()) return "_Bool";
+  if (pType == KV_DataType::float32()) return "float";
+  if (pType == KV_DataType::float64()) return "double";
+  static const std::pair<const KV_DataType* (*)(), const char*> kIntegers[] = {
+      {&KV_DataType::int8, "int8_t"},   {&KV_DataType::uint8, "uint8_t"},
+      {&KV_DataType::int16, "int16_t"}, {&KV_DataType::uint16, "uint16_t"},
+      {&KV_DataType::int32, "int32_t"}, {&KV_DataType::uint32, "uint32_t"}};
+  for (const auto& entry : kIntegers)
+    if (entry.first() == pType) return entry.second;
+  return "double";
+}
+
+// The helper that casts a double to the type; empty for double itself.
+std::string castHelperOf(const KV_DataType* pType) {
+  if (pType == KV_DataType::float64() || cTypeOf(pType) == std::string("double")) return "";
+  return std::string("ssa_to_") + nameOfDataType(pType);
+}
+
+bool sameBits(double a, double b) { return a == b && std::signbit(a) == std::signbit(b); }
+
+// Whether the saturation limits, which a store keeps exactly, are values of the C type.
+bool typeHoldsLimits(const KvCCfgSFVariable& variable) {
+  for (bool upper : {false, true}) {
+    if (!(upper ? variable.isUpperBorderSaturated() : variable.isLowerBorderSaturated())) continue;
+    double limit = upper ? variable.getUpperLimit() : variable.getLowerLimit();
+    KvCCfgValue cast(limit);
+    ::cast(variable.getDataType(), cast, true);
+    if (!sameBits(cast.getValue(), limit)) return false;
+  }
+  return true;
+}
+
+// A number as a C constant of type double that reads back exactly.
+std::string doubleLiteral(double number) {
+  if (std::isnan(number)) return "SSA_NAN";
+  if (std::isinf(number)) return number < 0 ? "-SSA_INF" : "SSA_INF";
+  std::string text = formatNumber(number);
+  if (text.find_first_of(".e") == std::string::npos) text += ".0";
+  return text;
+}
+
+std::string literalOf(const CVariable& variable, double number) {
+  return variable.heldAsDouble || variable.type == "float" ? doubleLiteral(number) : formatNumber(number);
+}
+
+std::string storeCall(const CVariable& variable, const std::string& value) {
+  if (variable.hasStoreHelper) return "ssa_store_" + variable.name + "(" + value + ")";
+  std::string cast = castHelperOf(variable.pVariable->getDataType());
+  return cast.empty() ? value : cast + "(" + value + ")";
+}
+
+// The program's name where C allows it; a name C or the emitter reserves gets a prefix, and a name
+// taken already a number.
+std::string uniqueName(const std::string& wanted, std::set<std::string>& taken) {
+  std::string base = isFreeCIdentifier(wanted) ? wanted : "v_" + wanted;
+  std::string name = base;
+  for (int suffix = 1; !isFreeCIdentifier(name) || !taken.insert(name).second; ++suffix)
+    name = base + "_" + std::to_string(suffix);
+  return name;
+}
+
+}  // namespace
+
+bool isFreeCIdentifier(const std::string& name) {
+  if (name.empty() || std::isdigit(static_cast<unsigned char>(name[0]))) return false;
+  for (char c : name)
+    if (!std::isalnum(static_cast<unsigned char>(c)) && c != '_') return false;
+  bool reservedByC =
+      startsWith(name, "__") || (name[0] == '_' && std::isupper(static_cast<unsigned char>(name[1])));
+  bool emitterName = startsWith(name, "ssa_") || startsWith(name, "SSA_") || startsWith(name, "proc_") ||
+                     startsWith(name, "sys_");
+  return !reservedByC && !emitterName && !kCKeywords.count(name) && !isStdintName(name);
+}
+
+CVariables::CVariables(const Program& program) {
+  std::set<std::string> taken;
+  for (const std::unique_ptr<KvCCfgSFVariable>& pVariable : program.variables()) {
+    CVariable variable;
+    variable.pVariable = pVariable.get();
+    variable.name = uniqueName(pVariable->getName(), taken);
+    variable.heldAsDouble = pVariable->isScaled() || pVariable->getDataType() == KV_DataType::float64() ||
+                            !typeHoldsLimits(*pVariable);
+    variable.type = variable.heldAsDouble ? "double" : cTypeOf(pVariable->getDataType());
+    variable.hasStoreHelper =
+        pVariable->isScaled() || pVariable->isUpperBorderSaturated() || pVariable->isLowerBorderSaturated();
+    variable.stored = pVariable->isOutput();
+    m_Index.emplace(pVariable.get(), m_Variables.size());
+    m_Variables.push_back(variable);
+  }
+}
+
+CVariable& CVariables::of(KvCCfgVariable* pVariable) {
+  auto found = m_Index.find(originalOf(pVariable));
+  if (found == m_Index.end()) throw Unemittable{"reads or writes a variable of no program"};
+  return m_Variables[found->second];
+}
+
+std::string CVariables::inputText(CVariable& variable) {
+  variable.readsInput = true;
+  return inputHook(variable) + "()";
+}
+
+std::string CVariables::readText(CVariable& variable) {
+  variable.stored = true;
+  return variable.heldAsDouble ? variable.name : "(double)" + variable.name;
+}
+
+std::string CVariables::storedConstant(CVariable& variable, double number) {
+  variable.stored = true;
+  return literalOf(variable, storedValue(*variable.pVariable, number));
+}
+
+std::string CVariables::storeText(CVariable& variable, const std::string& value) {
+  variable.stored = true;
+  return storeCall(variable, value);
+}
+
+namespace {
+
+class DeclarationWriter {
+public:
+  explicit DeclarationWriter(std::ostringstream& out) : m_Out(out) {}
+
+  void declare(const CVariable& variable) {
+    const KvCCfgSFVariable& declared = *variable.pVariable;
+    std::string initial = literalOf(variable, storedValue(declared, declared.getInitValue()->getValue()));
+    m_Out << "static " << variable.type << " " << variable.name;
+    if (declared.isArray()) {
+      m_Out << "[" << declared.getArrayLength() << "] = {";
+      bool allZero = initial == "0" || initial == "0.0";
+      for (std::uint32_t i = 0; i < (allZero ? 1 : declared.getArrayLength()); ++i)
+        m_Out << (i ? ", " : "") << initial;
+      m_Out << "}";
+    } else {
+      m_Out << " = " << initial;
+    }
+    m_Out << ";" << commentOf(variable) << "\n";
+  }
+
+  void storeHelper(const CVariable& variable) {
+    if (!variable.hasStoreHelper) return;
+    const KvCCfgSFVariable& declared = *variable.pVariable;
+    m_Out << "static inline " << variable.type << " ssa_store_" << variable.name << "(double x) {\n";
+    bool saturated = declared.isUpperBorderSaturated() || declared.isLowerBorderSaturated();
+    if (saturated) m_Out << "  int saturated = 0;\n";
+    if (declared.isUpperBorderSaturated())
+      m_Out << "  if (x > " << doubleLiteral(declared.getUpperLimit())
+            << ") {\n    x = " << doubleLiteral(declared.getUpperLimit()) << ";\n    saturated = 1;\n  }\n";
+    if (declared.isLowerBorderSaturated())
+      m_Out << "  if (x < " << doubleLiteral(declared.getLowerLimit())
+            << ") {\n    x = " << doubleLiteral(declared.getLowerLimit()) << ";\n    saturated = 1;\n  }\n";
+    if (saturated) m_Out << "  if (saturated) return x;\n";
+    m_Out << "  return " << unsaturatedStore(variable) << ";\n}\n";
+  }
+
+  void arrayHelpers(const CVariable& variable, const std::string& store, const std::string& hook) {
+    const KvCCfgSFVariable& declared = *variable.pVariable;
+    if (!declared.isArray()) return;
+    std::string length = std::to_string(declared.getArrayLength());
+    std::string element =
+        variable.heldAsDouble ? variable.name + "[ssa_i]" : "(double)" + variable.name + "[ssa_i]";
+    const std::string& name = variable.name;
+    m_Out << "static inline double ssa_read_" << name
+          << "(double ssa_at) {\n  int32_t ssa_i = ssa_int(ssa_at);\n"
+          << "  return ssa_i >= 0 && ssa_i < " << length << " ? " << element << " : 0.0;\n}\n";
+    m_Out << "static inline void ssa_write_" << name << "(double ssa_at, double ssa_new) {\n"
+          << "  int32_t ssa_i = ssa_int(ssa_at);\n  if (ssa_i >= 0 && ssa_i < " << length << ") " << name
+          << "[ssa_i] = " << store << ";\n}\n";
+    m_Out << "static inline void ssa_fill_" << name
+          << "(double ssa_new) {\n  int ssa_i;\n  for (ssa_i = 0; ssa_i < " << length << "; ++ssa_i) " << name
+          << "[ssa_i] = " << store << ";\n}\n";
+    m_Out << "static inline void ssa_observe_" << name << "(void) {\n  int ssa_i;\n  ssa_array_begin(\""
+          << declared.getName() << "\");\n  for (ssa_i = 0; ssa_i < " << length << "; ++ssa_i) ssa_element("
+          << element << ");\n  ssa_array_end();\n}\n";
+    if (variable.refilled)
+      m_Out << "static inline void ssa_refill_" << name
+            << "(void) {\n  int ssa_i;\n  for (ssa_i = 0; ssa_i < " << length << "; ++ssa_i) " << name
+            << "[ssa_i] = " << refilledValue(variable, hook) << ";\n}\n";
+  }
+
+private:
+  static std::string commentOf(const CVariable& variable) {
+    const KvCCfgSFVariable& declared = *variable.pVariable;
+    std::string notes;
+    if (variable.heldAsDouble && declared.getDataType() != KV_DataType::float64())
+      notes +=
+          std::string(nameOfDataType(declared.getDataType())) +
+          (declared.isScaled() ? " scaled: the value it stands for" : " with limits its type cannot hold");
+    if (declared.isOutput()) notes += std::string(notes.empty() ? "" : ", ") + "output";
+    if (declared.isVolatile()) notes += std::string(notes.empty() ? "" : ", ") + "input";
+    return notes.empty() ? "" : " /* " + notes + " */";
+  }
+
+  static std::string unsaturatedStore(const CVariable& variable) {
+    const KvCCfgSFVariable& declared = *variable.pVariable;
+    if (declared.isScaled()) {
+      const KV_Scaling& scaling = *declared.getScaling();
+      if (scaling.getLSB() == 0.0) return "x";
+      return "ssa_represent(x, " + doubleLiteral(scaling.getLSB()) + ", " +
+             doubleLiteral(scaling.getOffset()) + ")";
+    }
+    std::string cast = castHelperOf(declared.getDataType());
+    return cast.empty() ? "x" : cast + "(x)";
+  }
+
+  // The streams give values the variable holds already; only the C type needs converting.
+  static std::string refilledValue(const CVariable& variable, const std::string& hook) {
+    if (variable.heldAsDouble) return hook + "()";
+    std::string cast = castHelperOf(variable.pVariable->getDataType());
+    return cast.empty() ? hook + "()" : cast + "(" + hook + "())";
+  }
+
+  std::ostringstream& m_Out;
+};
+
+}  // namespace
+
+std::string CVariables::declarations() const {
+  std::ostringstream hooks, globals, helpers;
+  DeclarationWriter globalWriter(globals), helperWriter(helpers);
+  for (const CVariable& variable : m_Variables) {
+    if (hasInputHook(variable)) hooks << "double " << inputHook(variable) << "(void);\n";
+    if (!variable.stored) continue;
+    globalWriter.declare(variable);
+    helperWriter.storeHelper(variable);
+    helperWriter.arrayHelpers(variable, storeCall(variable, "ssa_new"), inputHook(variable));
+  }
+  std::string text;
+  for (const std::string& section : {hooks.str(), globals.str(), helpers.str()})
+    if (!section.empty()) text += section + "\n";
+  return text;
+}
+
+}  // namespace ssaopt::client::detail

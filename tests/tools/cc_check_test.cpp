@@ -1,0 +1,98 @@
+// The cc-check command as a user runs it: the C emitted for every example and for a batch of generated
+// programs compiles without a warning, runs clean under the undefined-behaviour sanitizer and gives
+// the interpreter's trace, as written and after the default pipeline.
+#include <gtest/gtest.h>
+#include <sys/stat.h>
+
+#include <cstdlib>
+#include <string>
+
+#include "tools/tool_running.h"
+
+namespace {
+
+using tooltest::example;
+using tooltest::fileWith;
+using tooltest::Result;
+using tooltest::ssaopt;
+
+const char* const kExamples[] = {"typical_run", "controller", "procedures", "loop", "outline"};
+
+TEST(ToolCcCheck, EveryExampleCompilesAndBehavesAsInterpreted) {
+  for (const char* name : kExamples) {
+    Result result = ssaopt("cc-check " + example(name) + " --runs 5");
+    EXPECT_EQ(result.status, 0) << name << "\n" << result.out << result.err;
+    EXPECT_EQ(result.out, "same behaviour on 5 runs (interpreter and compiled C)\n") << name;
+  }
+}
+
+TEST(ToolCcCheck, GeneratedProgramsCompileAndBehaveAsInterpreted) {
+  for (int seed = 1; seed <= 8; ++seed) {
+    Result generated = ssaopt("generate --seed " + std::to_string(seed));
+    ASSERT_EQ(generated.status, 0) << generated.err;
+    std::string path = fileWith("generated.ssa", generated.out);
+    Result result = ssaopt("cc-check " + path + " --runs 3 --steps 5");
+    EXPECT_EQ(result.status, 0) << "seed " << seed << "\n" << result.out << result.err;
+  }
+}
+
+TEST(ToolCcCheck, RegressionABooleanHoldsPlusZero) {
+  // A Boolean assigned -0.0 held -0.0, so the folded 1 / b was -inf where the compiled C gives inf.
+  std::string program = fileWith("zero.ssa",
+                                 "var bool b = 0;\n"
+                                 "var float64 in volatile;\n"
+                                 "var float64 r output = 0;\n"
+                                 "proc #main {\n"
+                                 "  b = -(in * 0);\n"
+                                 "  r = 1 / b;\n"
+                                 "}\n");
+  Result result = ssaopt("cc-check " + program + " --runs 3");
+  EXPECT_EQ(result.status, 0) << result.out << result.err;
+}
+
+// Runs cc-check with `compiler` as $CC.
+Result ccCheckWith(const std::string& compiler, const std::string& arguments) {
+  const char* pSaved = std::getenv("CC");
+  std::string saved = pSaved ? pSaved : "";
+  setenv("CC", compiler.c_str(), 1);
+  Result result = ssaopt("cc-check " + arguments);
+  pSaved ? setenv("CC", saved.c_str(), 1) : unsetenv("CC");
+  return result;
+}
+
+TEST(ToolCcCheck, ReportsWhereACompiledProgramComputesDifferently) {
+  // A compiler that makes every product of the original program one too large.
+  std::string compiler =
+      fileWith("cc",
+               "#!/bin/sh\n"
+               "for a; do case $a in *original.c) sed -i 's/: a \\* b;/: a * b + 1.0;/' $a;; esac; done\n"
+               "exec cc \"$@\"\n");
+  chmod(compiler.c_str(), 0700);
+  std::string program = fileWith("times.ssa",
+                                 "var int16 x output = 0;\n"
+                                 "proc #main {\n"
+                                 "  x = x * 2 + 3;\n"
+                                 "}\n");
+  Result result = ccCheckWith(compiler, program + " --steps 2");
+  EXPECT_EQ(result.status, 1) << result.err;
+  EXPECT_EQ(result.out,
+            "different behaviour with input seed 1:\n"
+            "  interpreter: output x = 9\n"
+            "  compiled original: output x = 10\n");
+}
+
+TEST(ToolCcCheck, SaysSoWhenThereIsNoCompiler) {
+  Result result = ccCheckWith("/nonexistent/cc", example("loop"));
+  EXPECT_EQ(result.status, 1);
+  EXPECT_EQ(result.err, "ssaopt: no C compiler '/nonexistent/cc': set CC or install cc\n");
+}
+
+TEST(ToolEmitC, WritesTheCOfTheOptimisedProgram) {
+  Result result = ssaopt("--emit=c " + example("typical_run"));
+  EXPECT_EQ(result.status, 0) << result.err;
+  EXPECT_NE(result.out.find("  command = ssa_to_int16(ssa_input_speed());\n"), std::string::npos)
+      << result.out;
+  EXPECT_EQ(result.out.find("limitCommand"), std::string::npos) << "inlined, so gone";
+}
+
+}  // namespace

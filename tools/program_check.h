@@ -1,0 +1,64 @@
+// What the fuzz command checks on one program, and how a failure is reproduced.
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "ssaopt/client/program.h"
+
+namespace ssaopt::tool {
+
+enum class ProblemKind {
+  None,
+  Invalid,      // the front end rejected the program
+  Report,       // an internal error or consistency report during the pipeline
+  RoundTrip,    // a program printed before the SSA transformation reads back differently
+  Behaviour,    // the pipeline changed what the program does
+  Determinism,  // another process printed a different result
+};
+
+struct Problem {
+  ProblemKind kind = ProblemKind::None;
+  std::string detail;  // lines, each ending in a newline
+
+  explicit operator bool() const { return kind != ProblemKind::None; }
+};
+
+class ProgramCheck {
+public:
+  // `tool` is the ssaopt executable that the determinism check runs.
+  ProgramCheck(std::vector<std::string> pipeline, std::string tool);
+
+  // The first problem of the program in `text`: it loads; the pipeline, with the internal checks on,
+  // reports nothing and leaves a consistent graph after every pass; the program printed after the
+  // front end and after every pass before "ssa" reads back as the same text; it behaves the same
+  // before and after the pipeline on a few input streams; and another process optimising it prints
+  // the same result.
+  // The determinism check starts a process, which takes longer than all other checks together, so
+  // the caller decides which programs it runs on.
+  // Everything the check allocates is freed when it returns: it installs a pool of its own.
+  Problem findProblem(const std::string& text, bool checkDeterminism) const;
+
+  // The command that shows `kind` of problem on the program in file `path`.
+  std::string reproduceCommand(ProblemKind kind, const std::string& path) const;
+
+  // " '--passes=...'" for a pipeline other than the default one; empty for the default one.
+  std::string passesOption() const;
+
+private:
+  // The program as printed after the front end or a pass, in the textual format.
+  struct PrintedSource {
+    std::string after;
+    std::string text;
+  };
+
+  // Runs the pipeline with the internal checks on and the graph checked after every pass; returns
+  // their reports, and adds the program printed wherever the format can still read it back.
+  std::string transform(client::Program& program, std::vector<PrintedSource>& sources) const;
+  Problem findDeterminismProblem(const std::string& text, const std::string& printed) const;
+
+  std::vector<std::string> m_Pipeline;
+  std::string m_Tool;
+};
+
+}  // namespace ssaopt::tool
