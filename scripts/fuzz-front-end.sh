@@ -1,8 +1,8 @@
 #!/usr/bin/env bash
 # Builds the front end's libFuzzer target with clang (in build-fuzz) and runs it for SECONDS seconds
-# (default 60) on a corpus seeded with the examples, inputs kept from earlier runs
-# (tests/fuzzing/corpus) and generated programs. Findings are written to build-fuzz/findings; the
-# script fails when there is one.
+# (default 60) on a corpus seeded with the examples, the programs of the regression tests and inputs
+# kept from earlier runs (tests/fuzzing/corpus), and generated programs. Findings are written to
+# build-fuzz/findings; the script fails when there is one.
 set -euo pipefail
 cd "$(dirname "$0")/.."
 seconds="${1:-60}"
