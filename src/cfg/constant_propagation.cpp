@@ -37,13 +37,13 @@ KvCCfgValue* boundOf(KvCCfgValue* pBound, const KvCCfgVariable& variable) {
   return pBound ? pBound : variable.getValue();
 }
 
-// The operands of `phi` once each, in ascending order: what its getUsedVariables() gives, without
-// building a set. The bounds merge takes the first operand without a known bound, so the order
-// matters.
+// The operands of `phi` once each, in the order of its getUsedVariables() (creation order of the
+// variables), without building a set. The bounds merge takes the first operand without a known bound,
+// so the order matters, and an order by address would make the result depend on the allocator.
 ssaopt::array<KvCCfgVariable*> distinctOperands(const KvCPhiFunction& phi) {
   ssaopt::array<KvCCfgVariable*> operands = phi.getReplacementVariables();
   operands.erase(std::remove(operands.begin(), operands.end(), nullptr), operands.end());
-  std::sort(operands.begin(), operands.end(), std::less<KvCCfgVariable*>());
+  std::sort(operands.begin(), operands.end(), ssaopt::set_order<KvCCfgVariable*>());
   operands.erase(std::unique(operands.begin(), operands.end()), operands.end());
   return operands;
 }
