@@ -72,11 +72,11 @@ void computeIdoms(benchmark::State& state, Shape shape, std::size_t statements) 
 
 void registerDominatorBenchmarks() {
   for (Shape shape : kShapes)
-    for (const BenchSize& size : kSizes)
+    for (std::size_t statements : benchmarkSizes(shape))
       benchmark::RegisterBenchmark(
-          (std::string("idoms/") + shapeName(shape) + "/" + std::to_string(size.statements)).c_str(),
-          computeIdoms, shape, size.statements)
-          ->Iterations(size.iterations * 3)
+          (std::string("idoms/") + shapeName(shape) + "/" + std::to_string(statements)).c_str(), computeIdoms,
+          shape, statements)
+          ->Iterations(iterationsAt(statements) * 3)
           ->UseManualTime()
           ->Unit(benchmark::kMillisecond);
 }

@@ -1,19 +1,18 @@
 // Writes one benchmark program to standard output, so that the tool can be profiled on it:
-//   ssaopt_make_program STATEMENTS large|small > program.ssa
+//   ssaopt_make_program STATEMENTS large|small|shared|chart > program.ssa
 #include <cstdlib>
 #include <iostream>
+#include <optional>
 #include <string>
 
 #include "program_shapes.h"
 
 int main(int argc, char** argv) {
-  std::string shape = argc == 3 ? argv[2] : "";
-  if (shape != "large" && shape != "small") {
-    std::cerr << "usage: ssaopt_make_program STATEMENTS large|small\n";
+  std::optional<ssaopt::bench::Shape> shape = ssaopt::bench::shapeNamed(argc == 3 ? argv[2] : "");
+  if (!shape) {
+    std::cerr << "usage: ssaopt_make_program STATEMENTS large|small|shared|chart\n";
     return 2;
   }
-  std::cout << ssaopt::bench::makeControllerProgram(
-      std::strtoull(argv[1], nullptr, 10), shape == "large" ? ssaopt::bench::Shape::FewLargeProcedures
-                                                            : ssaopt::bench::Shape::ManySmallProcedures);
+  std::cout << ssaopt::bench::makeControllerProgram(std::strtoull(argv[1], nullptr, 10), *shape);
   return 0;
 }

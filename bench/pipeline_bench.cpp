@@ -6,6 +6,8 @@
 
 #include "bench_session.h"
 #include "passes.h"
+#include "ssaopt/cfg/control_flow_graph.h"
+#include "ssaopt/ir/node_info.h"
 
 namespace ssaopt::bench {
 
@@ -34,12 +36,23 @@ void buildGraph(benchmark::State& state, Shape shape, std::size_t statements) {
   setPerStatement(state, "peak_bytes_per_stmt", peakBytes, statements);
 }
 
+// The statements and phi functions of the graph's blocks.
+std::size_t countStatements(const KvCControlFlowGraph& graph) {
+  std::size_t count = 0;
+  for (ssaopt::node v : graph.nodes())
+    if (const KvCBasicBlock* pBlock = graph.getBasicBlock(v))
+      count += pBlock->getStatementSeq().size() + pBlock->getPhiFunctions().size();
+  return count;
+}
+
 // Counters: ns_per_stmt for the whole pipeline and STEP_ns_per_stmt for each step, and the peak of
-// building and running the pipeline together, peak_bytes_per_stmt.
+// building and running the pipeline together, peak_bytes_per_stmt; ssa_stmts, the statements and phi
+// functions right after SSA form, with ns_per_ssa_stmt and peak_bytes_per_ssa_stmt per each of them.
 void runPipeline(benchmark::State& state, Shape shape, std::size_t statements) {
   const std::string& text = programText(shape, statements);
   std::map<std::string, double> stepNanoseconds;
   double nanoseconds = 0, peakBytes = 0;
+  std::size_t ssaStatements = 0;
   for (auto _ : state) {
     Session session;
     session.load(text);
@@ -50,6 +63,7 @@ void runPipeline(benchmark::State& state, Shape shape, std::size_t statements) {
       double stepSeconds = threadSeconds() - start;
       stepNanoseconds[step] += stepSeconds * kNanoseconds;
       seconds += stepSeconds;
+      if (step == "ssa") ssaStatements = countStatements(session.program().graph());
     }
     state.SetIterationTime(seconds);
     nanoseconds += seconds * kNanoseconds;
@@ -57,6 +71,9 @@ void runPipeline(benchmark::State& state, Shape shape, std::size_t statements) {
   }
   setPerStatement(state, "ns_per_stmt", nanoseconds, statements);
   setPerStatement(state, "peak_bytes_per_stmt", peakBytes, statements);
+  state.counters["ssa_stmts"] = static_cast<double>(ssaStatements);
+  setPerStatement(state, "ns_per_ssa_stmt", nanoseconds, ssaStatements);
+  setPerStatement(state, "peak_bytes_per_ssa_stmt", peakBytes, ssaStatements);
   for (const auto& [step, total] : stepNanoseconds)
     setPerStatement(state, step + "_ns_per_stmt", total, statements);
 }
@@ -65,14 +82,14 @@ void runPipeline(benchmark::State& state, Shape shape, std::size_t statements) {
 
 void registerPipelineBenchmarks() {
   for (Shape shape : kShapes)
-    for (const BenchSize& size : kSizes) {
-      std::string suffix = std::string("/") + shapeName(shape) + "/" + std::to_string(size.statements);
-      benchmark::RegisterBenchmark(("build" + suffix).c_str(), buildGraph, shape, size.statements)
-          ->Iterations(size.iterations)
+    for (std::size_t statements : benchmarkSizes(shape)) {
+      std::string suffix = std::string("/") + shapeName(shape) + "/" + std::to_string(statements);
+      benchmark::RegisterBenchmark(("build" + suffix).c_str(), buildGraph, shape, statements)
+          ->Iterations(iterationsAt(statements))
           ->UseManualTime()
           ->Unit(benchmark::kMillisecond);
-      benchmark::RegisterBenchmark(("pipeline" + suffix).c_str(), runPipeline, shape, size.statements)
-          ->Iterations(size.iterations)
+      benchmark::RegisterBenchmark(("pipeline" + suffix).c_str(), runPipeline, shape, statements)
+          ->Iterations(iterationsAt(statements))
           ->UseManualTime()
           ->Unit(benchmark::kMillisecond);
     }

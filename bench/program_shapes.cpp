@@ -1,8 +1,9 @@
 #include "program_shapes.h"
 
-#include <cstdint>
 #include <sstream>
 #include <vector>
+
+#include "program_writing.h"
 
 namespace ssaopt::bench {
 
@@ -17,27 +18,6 @@ constexpr int kFlags = 4;
 constexpr int kSettings = 4;
 constexpr std::size_t kLargeStages = 4;
 constexpr std::size_t kSmallProcedureStatements = 24;
-
-// splitmix64: the same seed gives the same program on every platform.
-class Random {
-public:
-  explicit Random(std::uint64_t seed) : m_State(seed) {}
-  int below(int bound) { return static_cast<int>(next() % static_cast<std::uint64_t>(bound)); }
-
-private:
-  std::uint64_t next() {
-    std::uint64_t z = (m_State += 0x9e3779b97f4a7c15ULL);
-    z = (z ^ (z >> 30)) * 0xbf58476d1ce4e5b9ULL;
-    z = (z ^ (z >> 27)) * 0x94d049bb133111ebULL;
-    return z ^ (z >> 31);
-  }
-  std::uint64_t m_State;
-};
-
-void declareNumbered(std::ostringstream& out, int count, const char* type, const char* name,
-                     const char* attributes) {
-  for (int i = 0; i < count; ++i) out << "var " << type << " " << name << i << attributes << ";\n";
-}
 
 void declareVariables(std::ostringstream& out) {
   declareNumbered(out, kInputs, "int16", "in", " scale(0.01) volatile");
@@ -56,16 +36,16 @@ void declareVariables(std::ostringstream& out) {
 // if/else diamonds, branches on constants, bounded loops and the calls it is given, in the middle.
 class BodyWriter {
 public:
-  BodyWriter(std::ostringstream& out, Random& random) : m_Out(out), m_Random(random) {}
+  BodyWriter(std::ostringstream& out, Random& random) : m_Text(out), m_Random(random) {}
 
   // Returns the statements written.
   std::size_t write(std::size_t budget, bool readsParameter, const std::vector<std::string>& calls) {
     if (readsParameter) line(temp() + " = u * 2;");
-    while (m_Statements < budget / 2) writeSegment();
+    while (m_Text.statements() < budget / 2) writeSegment();
     for (const std::string& call : calls) line(call);
-    while (m_Statements < budget) writeSegment();
+    while (m_Text.statements() < budget) writeSegment();
     line(output() + " = " + state() + " + " + temp() + ";");
-    return m_Statements;
+    return m_Text.statements();
   }
 
 private:
@@ -115,7 +95,7 @@ private:
     open(yes);
     line(shared);
     line(out + " = " + state() + ";");
-    m_Out << "  goto " << join << ";\n";
+    m_Text.jump(join);
     open(no);
     line(shared);
     line(out + " = 0;");
@@ -130,7 +110,7 @@ private:
     line("if " + flag + " goto " + yes + " else " + no + ";");
     open(yes);
     line(target + " = " + input() + ";");
-    m_Out << "  goto " << join << ";\n";
+    m_Text.jump(join);
     open(no);
     line(target + " = 0;");
     open(join);
@@ -145,25 +125,20 @@ private:
     open(body);
     line(accumulated + " = " + accumulated + " + " + temp() + " / 4;");
     line(counter + " = " + counter + " + 1;");
-    m_Out << "  goto " << head << ";\n";
+    m_Text.jump(head);
     open(done);
   }
 
-  void line(const std::string& statement) {
-    m_Out << "  " << statement << "\n";
-    ++m_Statements;
-  }
-  void open(const std::string& name) { m_Out << name << ":\n"; }
-  std::string label() { return "L" + std::to_string(m_Labels++); }
+  void line(const std::string& statement) { m_Text.line(statement); }
+  void open(const std::string& name) { m_Text.open(name); }
+  std::string label() { return m_Text.label(); }
   std::string input() { return "in" + std::to_string(m_Random.below(kInputs)); }
   std::string temp() { return "t" + std::to_string(m_Random.below(kTemporaries)); }
   std::string state() { return "s" + std::to_string(m_Random.below(kStates)); }
   std::string output() { return "out" + std::to_string(m_Random.below(kOutputs)); }
 
-  std::ostringstream& m_Out;
+  BodyText m_Text;
   Random& m_Random;
-  std::size_t m_Statements = 0;
-  int m_Labels = 0;
 };
 
 // A procedure reads its parameter u when it has one; arguments read temporaries only.
@@ -220,11 +195,7 @@ std::vector<Procedure> smallProcedures(std::size_t count, Random& random) {
   return procedures;
 }
 
-}  // namespace
-
-const char* shapeName(Shape shape) { return shape == Shape::FewLargeProcedures ? "large" : "small"; }
-
-std::string makeControllerProgram(std::size_t statements, Shape shape) {
+std::string makeProceduresProgram(std::size_t statements, Shape shape) {
   Random random(statements * 2 + (shape == Shape::FewLargeProcedures ? 0 : 1));
   std::vector<Procedure> procedures =
       shape == Shape::FewLargeProcedures
@@ -241,6 +212,44 @@ std::string makeControllerProgram(std::size_t statements, Shape shape) {
     written += writeProcedure(out, random, procedures[i], budget);
   }
   return out.str();
+}
+
+}  // namespace
+
+const char* shapeName(Shape shape) {
+  switch (shape) {
+    case Shape::FewLargeProcedures:
+      return "large";
+    case Shape::ManySmallProcedures:
+      return "small";
+    case Shape::SharedVariables:
+      return "shared";
+    case Shape::StateMachine:
+      return "chart";
+  }
+  return "";
+}
+
+std::optional<Shape> shapeNamed(const std::string& name) {
+  for (Shape shape : kShapes)
+    if (name == shapeName(shape)) return shape;
+  return std::nullopt;
+}
+
+std::vector<std::size_t> benchmarkSizes(Shape shape) {
+  if (shape == Shape::SharedVariables) return {100, 1000, 10000, 100000};
+  return {1000, 10000, 100000, 1000000};
+}
+
+std::string makeControllerProgram(std::size_t statements, Shape shape) {
+  switch (shape) {
+    case Shape::SharedVariables:
+      return detail::makeSharedVariablesProgram(statements);
+    case Shape::StateMachine:
+      return detail::makeStateMachineProgram(statements);
+    default:
+      return makeProceduresProgram(statements, shape);
+  }
 }
 
 }  // namespace ssaopt::bench
