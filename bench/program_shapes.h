@@ -47,6 +47,17 @@ std::vector<std::size_t> benchmarkSizes(Shape shape);
 // The arms of the outer state machine of a StateMachine program of `statements` statements.
 std::size_t chartArms(std::size_t statements);
 
+// Programs that each push one dimension to its limit, of a size: a flat expression of that many terms
+// (a = x + x + ...), one join of that many in-edges (a phi function of as many operands), and loops
+// nested that deep.
+enum class Corner { FlatExpression, WideJoin, LoopNest };
+inline constexpr Corner kCorners[] = {Corner::FlatExpression, Corner::WideJoin, Corner::LoopNest};
+
+// "flat", "join" or "nest".
+const char* cornerName(Corner corner);
+std::optional<Corner> cornerNamed(const std::string& name);
+std::string makeCornerProgram(Corner corner, std::size_t size);
+
 namespace detail {
 std::string makeSharedVariablesProgram(std::size_t statements);
 std::string makeStateMachineProgram(std::size_t statements);
