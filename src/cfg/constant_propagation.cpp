@@ -3,15 +3,16 @@
 // the constants found so far leave executable.
 //
 //   before:  c.1 = 1; if (c.1) { x.1 = 2; } else { x.2 = 3; }  x.3 = phi(x.1, x.2); y.1 = x.3 + 1
-//   after:   c.1 = 1, x.1 = 2 in [2, 2], x.3 = 2, y.1 = 3; x.2 is never reached and stays
-//            undetermined, which leaves the meet at x.3 alone; only the true edge is executable.
-//            With removeDeadCode the else block and the x.2 operand go, and x.3 gets [2, 2].
+//   after:   c.1 = 1 and x.1 = 2 in [2, 2]; only the true edge is executable. x.2 is never reached
+//            and stays undetermined, and a phi function merges all its operands, so x.3 and y.1
+//            stay undetermined as well.
+//   with removeDeadCode, the else block goes after the first pass, x.3 = phi(x.1) keeps one operand,
+//            and the next pass gives x.3 = 2 in [2, 2] and y.1 = 3.
 //
 // Needs SSA form and divided blocks (one phi function, one statement or the condition alone).
-#include <algorithm>
 #include <cstring>
-#include <functional>
 
+#include "phi_merge.h"
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/ir/expression.h"
 #include "ssaopt/ir/procedure.h"
@@ -19,41 +20,12 @@
 #include "ssaopt/ir/variable.h"
 #include "ssaopt/values/arithmetic.h"
 
+using ssaopt::array;
 using ssaopt::edge;
-using ssaopt::list;
 using ssaopt::node;
+using ssaopt::cfg::PhiMerge;
 
 namespace {
-
-edge popFront(list<edge>& workList) {
-  edge e = workList.front();
-  workList.pop_front();
-  return e;
-}
-
-// A range bound of an operand. Only SSA versions keep a range; any other variable's bounds are its
-// value, which is as much as anybody knows of it.
-KvCCfgValue* boundOf(KvCCfgValue* pBound, const KvCCfgVariable& variable) {
-  return pBound ? pBound : variable.getValue();
-}
-
-// The operands of `phi` once each, in the order of its getUsedVariables() (creation order of the
-// variables), without building a set. The bounds merge takes the first operand without a known bound,
-// so the order matters, and an order by address would make the result depend on the allocator.
-ssaopt::array<KvCCfgVariable*> distinctOperands(const KvCPhiFunction& phi) {
-  ssaopt::array<KvCCfgVariable*> operands = phi.getReplacementVariables();
-  operands.erase(std::remove(operands.begin(), operands.end(), nullptr), operands.end());
-  std::sort(operands.begin(), operands.end(), ssaopt::set_order<KvCCfgVariable*>());
-  operands.erase(std::unique(operands.begin(), operands.end()), operands.end());
-  return operands;
-}
-
-// Overwrites the elements of `values`, one per operand, with what `of` gives for each operand.
-template <class Of>
-void fillWith(list<KvCCfgValue*>& values, const ssaopt::array<KvCCfgVariable*>& operands, Of of) {
-  auto slot = values.begin();
-  for (KvCCfgVariable* pOperand : operands) *slot++ = of(pOperand);
-}
 
 // The cast to the variable's type wraps a bound that leaves the type's range (an int8 in [0, 100]
 // plus 100 gives [100, -56]); a wrapped range claims too little, so the variable gets no range.
@@ -99,7 +71,330 @@ private:
   Copy m_Value, m_Min, m_Max;
 };
 
+// Calls `onUse` for every variable that the node reads, once or more often. A block's items are
+// asked one by one: the union that the block's getUsedVariables() builds costs another set per node.
+template <class OnUse>
+void forEachUsedVariable(KvCCfgNodeInfo& payload, OnUse onUse) {
+  KvCBasicBlock* pBlock = payload.isBasicBlock();
+  if (!pBlock) {
+    for (KvCCfgVariable* pVariable : payload.getUsedVariables()) onUse(pVariable);
+    return;
+  }
+  for (const KvCPhiFunction* pPhi : pBlock->getPhiFunctions())
+    for (KvCCfgVariable* pVariable : pPhi->getUsedVariables()) onUse(pVariable);
+  for (const KvCCfgStatement* pStatement : pBlock->getStatementSeq())
+    for (KvCCfgVariable* pVariable : pStatement->getUsedVariables()) onUse(pVariable);
+  if (const KvCCfgExpression* pCond = pBlock->getBranchCond())
+    for (KvCCfgVariable* pVariable : pCond->getUsedVariables()) onUse(pVariable);
+}
+
 }  // namespace
+
+// ---- The run -------------------------------------------------------------------------------------
+
+// A visit of a procedure is a function of the procedure's own values, ranges and blocks and of the
+// values and ranges it reads through SSA edges from other procedures. So a procedure whose last visit
+// changed none of its definitions, and none of whose inputs changed since, would repeat that visit
+// exactly: a pass passes over it. Procedures are numbered by their position in the table.
+//
+// A phi node is visited on every edge into it that becomes executable and after every change of an
+// operand. Its merge (PhiMerge) is made at its first visit and kept until dead-code elimination takes
+// operands away; a merge of many operands reads again only the blocks of operands that changed,
+// which every definition that changes tells it through the registrations of its variable.
+class KvCControlFlowGraph::PropagationRun {
+public:
+  explicit PropagationRun(KvCControlFlowGraph& G) : m_G(G) { m_G.m_pPropagation = this; }
+  ~PropagationRun() { m_G.m_pPropagation = nullptr; }
+  PropagationRun(const PropagationRun&) = delete;
+  PropagationRun& operator=(const PropagationRun&) = delete;
+
+  // Passes repeat while a pass made a variable constant or dead-code removal took a phi operand away,
+  // for either can make a condition constant that was not before. The procedures are taken in the
+  // table's order, ascending by name; a pass passes over those that would repeat their last visit
+  // exactly, except the last one, whose executable flags are the ones that stay.
+  void run(bool removeDeadCode) {
+    numberProcedures();
+    // What the first visit's start would do; every later visit then clears only what the visit
+    // before it set, and dead-code elimination deletes no edge that carries the flag.
+    m_G.clearAllVisited();
+    if (m_Entries.empty()) return;
+    deactivateAllEdges();
+    std::size_t last = m_Entries.size() - 1;
+    bool repeat = true;
+    while (repeat) {
+      bool changed = false;
+      for (std::size_t procedure = 0; procedure <= last; ++procedure)
+        if (m_Unsettled[procedure] || procedure == last) visitProcedure(procedure, changed);
+      bool deleted = removeDeadCode && m_G.eliminateDeadCode();
+      repeat = changed || deleted;
+    }
+  }
+
+  // ---- Executable edges ----
+
+  void activate(edge e) {
+    m_G.inf(e)->activateEdgeExecutable();
+    m_ExecutableEdges.push_back(e);
+    ++m_ExecutableInEdges[m_G.target(e)];
+  }
+  int executableInEdges(node v) const { return m_ExecutableInEdges[v]; }
+
+  // Every procedure starts from no executable edge at all, so the flags left after a pass are those
+  // of the procedure processed last. The pass cleared every flag before the first procedure; each
+  // later one clears the flags its predecessors set, which is the same and costs what they reached.
+  void deactivateExecutableEdges() {
+    for (edge e : m_ExecutableEdges) {
+      m_G.inf(e)->deactivateEdgeExecutable();
+      --m_ExecutableInEdges[m_G.target(e)];
+    }
+    m_ExecutableEdges.clear();
+  }
+
+  // ---- Definitions ----
+
+  // The shared visit of assignments, parameter and value-return statements: `definition` gives the
+  // new value, minimum and maximum of `pVariable`. `stores` is false where no store happens (a
+  // value-return statement takes back a value the variable already holds), so the value is not
+  // adjusted to the variable a second time. The variable's previous value object is the visit's
+  // once the new one is stored: it is compared with the new value and then freed. Only a value going
+  // from undetermined to constant asks for another pass; any change wakes the uses.
+  template <class Definition>
+  void visitDefinition(KvCCfgVariable* pVariable, const Definition& definition, node v,
+                       EdgeWorkList& cfgWorkList, EdgeWorkList& ssaWorkList, bool& changed, bool stores) {
+    DefinitionSnapshot before(*pVariable);
+    KvCCfgValue* pOld = pVariable->getValue();
+    KvCCfgValue value = definition.evaluate();
+    if (stores)
+      pVariable->setVarValueAndAdjustCfgValue(value);
+    else
+      pVariable->setVarValue(value);
+    recordRange(pVariable, definition);
+    if (!before.matches(*pVariable)) definitionChanged(v, *pVariable);
+    if (pOld->compare(value) != 0) {
+      if (pOld->isUndetermined() && value.isConstant()) changed = true;
+      appendSSAOutEdges(v, ssaWorkList);
+    }
+    if (!value.isNonConstant()) appendCfgOutEdges(v, cfgWorkList);
+    delete pOld;
+  }
+
+  // A definition at `v` now holds another value or range: its procedure and the procedures of its
+  // uses are visited again in the next pass, and the merges that read it read it again.
+  void definitionChanged(node v, const KvCCfgVariable& variable) {
+    unsettleProcedureOf(v);
+    for (edge e : m_G.out(v))
+      if (m_G.inf(e)->isSSAEdge()) unsettleProcedureOf(m_G.target(e));
+    std::size_t index = variable.getIndex();
+    if (index >= m_FirstRegistration.size()) return;
+    for (int r = m_FirstRegistration[index]; r != kNone;
+         r = m_Registrations[static_cast<std::size_t>(r)].next) {
+      const Registration& registration = m_Registrations[static_cast<std::size_t>(r)];
+      if (registration.pVariable == &variable) m_Merges[registration.merge].invalidate(registration.block);
+    }
+  }
+
+  void appendCfgOutEdges(node v, EdgeWorkList& workList) const {
+    for (edge e = m_G.firstCfgOutEdge(v); e; e = m_G.nextCfgOutEdge(e)) workList.push_back(e);
+  }
+
+  void appendSSAOutEdges(node v, EdgeWorkList& workList) const {
+    for (edge e : m_G.out(v))
+      if (m_G.inf(e)->isSSAEdge()) workList.push_back(e);
+  }
+
+  // ---- Phi functions ----
+
+  // The phi functions of two operands, the most common by far, are merged from scratch at every visit;
+  // a merge is kept for the others, and one of many operands keeps partial results.
+  PhiMerge::Result mergeOperands(node v, const KvCPhiFunction& phi) {
+    if (m_MergeAt[v] != kNone) return m_Merges[static_cast<std::size_t>(m_MergeAt[v])].merge();
+    PhiMerge::distinctOperands(phi, m_Operands);
+    if (m_Operands.size() <= kMergedFromScratch) return PhiMerge::mergeAll(m_Operands);
+    m_MergeAt[v] = static_cast<int>(m_Merges.size());
+    m_Merges.emplace_back(m_Operands);
+    if (m_Merges.back().readsOnlyChangedBlocks()) registerOperands(m_Merges.size() - 1);
+    return m_Merges.back().merge();
+  }
+
+  // The merge at `link` no longer matches its operands; its registrations are left to lead nowhere.
+  void forgetMerge(node link) {
+    int merge = m_MergeAt[link];
+    if (merge == kNone) return;
+    m_Merges[static_cast<std::size_t>(merge)] = PhiMerge();
+    m_MergeAt[link] = kNone;
+  }
+
+  // ---- Dead blocks ----
+
+  // The blocks it leads to lose in-edges and phi operands; a deleted call takes its arguments out of
+  // the parameter statements of the procedure it calls.
+  void unsettleProceduresOfDeadBlock(node n) {
+    unsettleProcedureOf(n);
+    for (edge e = m_G.firstCfgOutEdge(n); e; e = m_G.nextCfgOutEdge(e)) unsettleProcedureOf(m_G.target(e));
+    for (KvCCfgStatement* pStatement : m_G.getBasicBlock(n)->getStatementSeq())
+      if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall())
+        if (KvCCfgProcedure* pCallee = m_G.findProcedure(pCall->getName()))
+          unsettleProcedureOf(pCallee->getEntryNode());
+  }
+
+private:
+  static constexpr int kNone = -1;
+  static constexpr std::size_t kMergedFromScratch = 2;
+
+  // An operand of an incremental merge: the variable, the merge and the block of its operands that
+  // holds it, and the next registration of a variable with the same index.
+  struct Registration {
+    const KvCCfgVariable* pVariable;
+    std::size_t merge;
+    std::size_t block;
+    int next;
+  };
+
+  // Gives every node the number of the procedure whose entry reaches it along control-flow edges
+  // (procedures are the components of those; -1 for a node that no entry reaches). Every procedure
+  // is unsettled.
+  void numberProcedures() {
+    m_ProcedureOf.init(m_G, kNone);
+    m_MergeAt.init(m_G, kNone);
+    m_ExecutableInEdges.init(m_G, 0);
+    array<node> stack;
+    for (const auto& named : m_G.m_Procedures) {
+      int procedure = static_cast<int>(m_Entries.size());
+      node entry = named.second->getEntryNode();
+      m_Entries.push_back(entry);
+      m_ProcedureOf[entry] = procedure;
+      stack.push_back(entry);
+      while (!stack.empty()) {
+        node v = stack.back();
+        stack.pop_back();
+        for (edge e = m_G.firstCfgOutEdge(v); e; e = m_G.nextCfgOutEdge(e)) {
+          node w = m_G.target(e);
+          if (m_ProcedureOf[w] != kNone) continue;
+          m_ProcedureOf[w] = procedure;
+          stack.push_back(w);
+        }
+      }
+    }
+    m_Unsettled.assign(m_Entries.size(), true);
+    m_VisitedBy.assign(m_Entries.size(), {});
+  }
+
+  void deactivateAllEdges() {
+    for (edge e : m_G.edges()) m_G.inf(e)->deactivateEdgeExecutable();
+    m_ExecutableEdges.clear();
+  }
+
+  // The visit starts from the marks of the procedure's last visit cleared, as a pass that clears all
+  // marks would leave them; the marks of the procedures a pass passes over stay for dead-code
+  // elimination.
+  void visitProcedure(std::size_t procedure, bool& changed) {
+    m_Unsettled[procedure] = false;
+    for (node v : m_VisitedBy[procedure]) m_G.m_Visited[v] = false;
+    m_VisitedBy[procedure].clear();
+    m_Current = procedure;
+    propagateFrom(m_Entries[procedure], changed);
+  }
+
+  // The two lists are served in turn, one edge each, until both are empty.
+  void propagateFrom(node entry, bool& changed) {
+    m_G.initSparseConditionalConstant(entry, m_CfgWorkList, m_SSAWorkList);
+    while (!m_CfgWorkList.empty() || !m_SSAWorkList.empty()) {
+      if (!m_CfgWorkList.empty()) flowStep(changed);
+      if (!m_SSAWorkList.empty()) ssaStep(changed);
+    }
+  }
+
+  // A phi node is visited on every edge into it that becomes executable; any other node only on the
+  // first, later ones reach it through its SSA in-edges.
+  void flowStep(bool& changed) {
+    edge e = m_CfgWorkList.pop_front();
+    if (m_G.inf(e)->isEdgeExecutable()) return;
+    activate(e);
+    node v = m_G.target(e);
+    if (KvCBasicBlock* pBlock = m_G.getBasicBlock(v)) {
+      markVisited(v);
+      if (KvCPhiFunction* pPhi = pBlock->isPhiFunction())
+        m_G.visitPhiFunction(pPhi, v, changed);
+      else if (m_G.countExecutableInEdges(v) == 1)
+        m_G.visitInstruction(pBlock, v, m_CfgWorkList, m_SSAWorkList, changed);
+    }
+    // A branch schedules its edges itself, when its condition is visited.
+    if (m_G.countCfgOutEdges(v) == 1) appendCfgOutEdges(v, m_CfgWorkList);
+  }
+
+  // Sets no executable flag: a use is revisited only where control already reaches it, phi functions
+  // excepted, which always merge all their operands.
+  void ssaStep(bool& changed) {
+    node v = m_G.target(m_SSAWorkList.pop_front());
+    KvCBasicBlock* pBlock = m_G.getBasicBlock(v);
+    if (!pBlock) return;
+    if (KvCPhiFunction* pPhi = pBlock->isPhiFunction())
+      m_G.visitPhiFunction(pPhi, v, changed);
+    else if (m_G.countExecutableInEdges(v) >= 1)
+      m_G.visitInstruction(pBlock, v, m_CfgWorkList, m_SSAWorkList, changed);
+  }
+
+  void markVisited(node v) {
+    m_G.setVisited(v);
+    m_VisitedBy[m_Current].push_back(v);
+  }
+
+  void unsettleProcedureOf(node v) {
+    int procedure = m_ProcedureOf[v];
+    if (procedure != kNone) m_Unsettled[static_cast<std::size_t>(procedure)] = true;
+  }
+
+  // The minimum is stored before the maximum is computed: a definition that reads its own variable
+  // (a recursive call passing a parameter on) sees the new value in both bounds.
+  template <class Definition>
+  static void recordRange(KvCCfgVariable* pVariable, const Definition& definition) {
+    KvCCfgValue minimum = definition.getMinimum();
+    pVariable->setMinValueAndDestroyOld(minimum);
+    KvCCfgValue maximum = definition.getMaximum();
+    pVariable->setMaxValueAndDestroyOld(maximum);
+    dropInvertedRange(*pVariable);
+  }
+
+  // Chains the registrations of every operand of merge `merge` to its variable's index.
+  void registerOperands(std::size_t merge) {
+    const PhiMerge& phiMerge = m_Merges[merge];
+    for (std::size_t i = 0; i < phiMerge.operands().size(); ++i) {
+      const KvCCfgVariable* pOperand = phiMerge.operands()[i];
+      std::size_t index = pOperand->getIndex();
+      if (index >= m_FirstRegistration.size()) m_FirstRegistration.resize(index + 1, kNone);
+      m_Registrations.push_back({pOperand, merge, phiMerge.blockOf(i), m_FirstRegistration[index]});
+      m_FirstRegistration[index] = static_cast<int>(m_Registrations.size() - 1);
+    }
+  }
+
+  KvCControlFlowGraph& m_G;
+  EdgeWorkList m_CfgWorkList;
+  EdgeWorkList m_SSAWorkList;
+
+  // The procedure record.
+  ssaopt::node_array<int> m_ProcedureOf;
+  array<node> m_Entries;           // per procedure
+  array<bool> m_Unsettled;         // per procedure: to be visited in the next pass
+  array<array<node>> m_VisitedBy;  // per procedure: the nodes its last visit marked visited
+  std::size_t m_Current = 0;       // the procedure being visited
+
+  // The edges whose executable flag the current pass set since the last clearing, so that the next
+  // procedure clears only those instead of every edge of the graph; and per node how many in-edges
+  // carry the flag, which the flow step asks at every edge that becomes executable (counting at a
+  // join with many in-edges each time would be quadratic).
+  array<edge> m_ExecutableEdges;
+  ssaopt::node_array<int> m_ExecutableInEdges;
+
+  // The merges kept for phi functions of many operands, by node, and the registrations of their
+  // operands: the first per variable index, and each one's successor.
+  ssaopt::node_array<int> m_MergeAt;
+  array<PhiMerge> m_Merges;
+  array<int> m_FirstRegistration;
+  array<Registration> m_Registrations;
+  array<KvCCfgVariable*> m_Operands;  // scratch
+};
+
+// ---- The steps -----------------------------------------------------------------------------------
 
 void KvCControlFlowGraph::propagateSparseConditionalConstant(bool removeDeadCode) {
   addSSAEdges();
@@ -113,7 +408,7 @@ void KvCControlFlowGraph::addSSAEdges() {
     KvCCfgNodeInfo* pInf = inf(v);
     if (!pInf) continue;
     for (KvCCfgVariable* pVariable : pInf->getAssignedVariables())
-      for (node user : pVariable->getUses()) new_edge(v, user, new KvCSSAEdge());
+      for (node user : pVariable->uses()) new_edge(v, user, new KvCSSAEdge());
   }
 }
 
@@ -124,173 +419,23 @@ void KvCControlFlowGraph::buildVarUses() {
       for (KvCCfgVariable* pVariable : pInf->getAssignedVariables()) pVariable->clearUses();
   for (node v : nodes())
     if (KvCCfgNodeInfo* pInf = inf(v))
-      for (KvCCfgVariable* pVariable : pInf->getUsedVariables()) pVariable->appendUse(v);
+      forEachUsedVariable(*pInf, [v](KvCCfgVariable* pVariable) { pVariable->appendUse(v); });
 }
 
-// Passes repeat while a pass made a variable constant or dead-code removal took a phi operand away,
-// for either can make a condition constant that was not before. The procedures are taken in the
-// table's order, ascending by name; a pass passes over those that would repeat their last visit
-// exactly (see PropagationRecord), except the last one, whose executable flags are the ones that
-// stay.
 void KvCControlFlowGraph::sparseConditionalConstant(bool removeDeadCode) {
-  list<edge> cfgWorkList;
-  list<edge> ssaWorkList;
-  startPropagationRecord();
-  // What the first visit's start would do; every later visit then clears only what the visit before
-  // it set, and dead-code elimination deletes no edge that carries the flag.
-  clearAllVisited();
-  if (!m_Procedures.empty()) deactivateAllEdges();
-  int last = static_cast<int>(m_Procedures.size()) - 1;
-  bool repeat = true;
-  while (repeat) {
-    bool changed = false;
-    for (int procedure = 0; procedure <= last; ++procedure)
-      if (m_Propagation.unsettled[static_cast<std::size_t>(procedure)] || procedure == last)
-        visitProcedure(procedure, cfgWorkList, ssaWorkList, changed);
-    bool deleted = removeDeadCode && eliminateDeadCode();
-    repeat = changed || deleted;
-  }
-  // The flags stay as the last procedure left them; the record of them must not outlive the edges.
-  m_ExecutableEdges.clear();
-  m_Propagation = PropagationRecord();
+  PropagationRun(*this).run(removeDeadCode);
 }
 
-// Numbers the procedures and gives every node the number of the procedure whose entry reaches it
-// along control-flow edges (procedures are the components of those). Every procedure is unsettled.
-void KvCControlFlowGraph::startPropagationRecord() {
-  std::size_t count = m_Procedures.size();
-  m_Propagation.procedureOf.init(*this, -1);
-  m_Propagation.unsettled.assign(count, true);
-  m_Propagation.visitedBy.assign(count, {});
-  m_Propagation.entries.clear();
-  ssaopt::array<node> stack;
-  for (const auto& named : m_Procedures) {
-    int procedure = static_cast<int>(m_Propagation.entries.size());
-    node entry = named.second->getEntryNode();
-    m_Propagation.entries.push_back(entry);
-    m_Propagation.procedureOf[entry] = procedure;
-    stack.push_back(entry);
-    while (!stack.empty()) {
-      node v = stack.back();
-      stack.pop_back();
-      for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) {
-        node w = target(e);
-        if (m_Propagation.procedureOf[w] != -1) continue;
-        m_Propagation.procedureOf[w] = procedure;
-        stack.push_back(w);
-      }
-    }
-  }
-}
-
-// The visit starts from the marks of the procedure's last visit cleared, as a pass that clears all
-// marks would leave them.
-void KvCControlFlowGraph::visitProcedure(int procedure, list<edge>& cfgWorkList, list<edge>& ssaWorkList,
-                                         bool& changed) {
-  std::size_t i = static_cast<std::size_t>(procedure);
-  m_Propagation.unsettled[i] = false;
-  for (node v : m_Propagation.visitedBy[i]) m_Visited[v] = false;
-  m_Propagation.visitedBy[i].clear();
-  m_Propagation.current = procedure;
-  propagateFrom(m_Propagation.entries[i], cfgWorkList, ssaWorkList, changed);
-}
-
-void KvCControlFlowGraph::unsettleDefinitionAt(node v) {
-  unsettleProcedureOf(v);
-  for (edge e : out(v))
-    if (inf(e)->isSSAEdge()) unsettleProcedureOf(target(e));
-}
-
-void KvCControlFlowGraph::unsettleProcedureOf(node v) {
-  int procedure = m_Propagation.procedureOf[v];
-  if (procedure >= 0) m_Propagation.unsettled[static_cast<std::size_t>(procedure)] = true;
-}
-
-// The blocks it leads to lose in-edges and phi operands; a deleted call takes its arguments out of the
-// parameter statements of the procedure it calls.
-void KvCControlFlowGraph::unsettleProceduresOfDeadBlock(node n) {
-  unsettleProcedureOf(n);
-  for (edge e = firstCfgOutEdge(n); e; e = nextCfgOutEdge(e)) unsettleProcedureOf(target(e));
-  for (KvCCfgStatement* pStatement : getBasicBlock(n)->getStatementSeq())
-    if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall())
-      if (KvCCfgProcedure* pCallee = findProcedure(pCall->getName()))
-        unsettleProcedureOf(pCallee->getEntryNode());
-}
-
-// The two lists are served in turn, one edge each, until both are empty.
-void KvCControlFlowGraph::propagateFrom(node entry, list<edge>& cfgWorkList, list<edge>& ssaWorkList,
-                                        bool& changed) {
-  initSparseConditionalConstant(entry, cfgWorkList, ssaWorkList);
-  while (!cfgWorkList.empty() || !ssaWorkList.empty()) {
-    if (!cfgWorkList.empty()) flowStep(cfgWorkList, ssaWorkList, changed);
-    if (!ssaWorkList.empty()) ssaStep(cfgWorkList, ssaWorkList, changed);
-  }
-}
-
-// Every procedure starts from no executable edge at all, so the flags left after a pass are those of
-// the procedure processed last. The pass cleared every flag before the first procedure; each later
-// one clears the flags its predecessors set, which is the same and costs what they reached.
-void KvCControlFlowGraph::initSparseConditionalConstant(node entry, list<edge>& cfgWorkList,
-                                                        list<edge>& ssaWorkList) {
+void KvCControlFlowGraph::initSparseConditionalConstant(node entry, EdgeWorkList& cfgWorkList,
+                                                        EdgeWorkList& ssaWorkList) {
   cfgWorkList.clear();
   ssaWorkList.clear();
   for (edge e : out(entry)) cfgWorkList.push_back(e);
-  deactivateExecutableEdges();
+  m_pPropagation->deactivateExecutableEdges();
 }
 
-void KvCControlFlowGraph::deactivateAllEdges() {
-  for (edge e : edges()) inf(e)->deactivateEdgeExecutable();
-  m_ExecutableEdges.clear();
-  m_ExecutableInEdges.fill(0);
-}
-
-void KvCControlFlowGraph::deactivateExecutableEdges() {
-  for (edge e : m_ExecutableEdges) {
-    inf(e)->deactivateEdgeExecutable();
-    --m_ExecutableInEdges[target(e)];
-  }
-  m_ExecutableEdges.clear();
-}
-
-void KvCControlFlowGraph::activateEdge(edge e) {
-  inf(e)->activateEdgeExecutable();
-  m_ExecutableEdges.push_back(e);
-  ++m_ExecutableInEdges[target(e)];
-}
-
-// A phi node is visited on every edge into it that becomes executable; any other node only on the
-// first, later ones reach it through its SSA in-edges.
-void KvCControlFlowGraph::flowStep(list<edge>& cfgWorkList, list<edge>& ssaWorkList, bool& changed) {
-  edge e = popFront(cfgWorkList);
-  if (inf(e)->isEdgeExecutable()) return;
-  activateEdge(e);
-  node v = target(e);
-  if (KvCBasicBlock* pBlock = getBasicBlock(v)) {
-    setVisited(v);
-    m_Propagation.visitedBy[static_cast<std::size_t>(m_Propagation.current)].push_back(v);
-    if (KvCPhiFunction* pPhi = pBlock->isPhiFunction())
-      visitPhiFunction(pPhi, v, changed);
-    else if (countExecutableInEdges(v) == 1)
-      visitInstruction(pBlock, v, cfgWorkList, ssaWorkList, changed);
-  }
-  // A branch schedules its edges itself, when its condition is visited.
-  if (countCfgOutEdges(v) == 1) appendCfgOutEdges(v, cfgWorkList);
-}
-
-// Sets no executable flag: a use is revisited only where control already reaches it, phi functions
-// excepted, which always merge all their operands.
-void KvCControlFlowGraph::ssaStep(list<edge>& cfgWorkList, list<edge>& ssaWorkList, bool& changed) {
-  node v = target(popFront(ssaWorkList));
-  KvCBasicBlock* pBlock = getBasicBlock(v);
-  if (!pBlock) return;
-  if (KvCPhiFunction* pPhi = pBlock->isPhiFunction())
-    visitPhiFunction(pPhi, v, changed);
-  else if (countExecutableInEdges(v) >= 1)
-    visitInstruction(pBlock, v, cfgWorkList, ssaWorkList, changed);
-}
-
-void KvCControlFlowGraph::visitInstruction(KvCBasicBlock* pBasicBlock, node v, list<edge>& cfgWorkList,
-                                           list<edge>& ssaWorkList, bool& changed) {
+void KvCControlFlowGraph::visitInstruction(KvCBasicBlock* pBasicBlock, node v, EdgeWorkList& cfgWorkList,
+                                           EdgeWorkList& ssaWorkList, bool& changed) {
   KvCCfgExpression* pCond = pBasicBlock->getBranchCond();
   KvCCfgStatement* pStatement = pBasicBlock->isStatement();
   KvCCfgAssignment* pAssignment = pStatement ? pStatement->isAssignment() : nullptr;
@@ -305,69 +450,36 @@ void KvCControlFlowGraph::visitInstruction(KvCBasicBlock* pBasicBlock, node v, l
   else if (pReturn)
     visitValueReturnStatement(pReturn, v, cfgWorkList, ssaWorkList, changed);
   else
-    appendCfgOutEdges(v, cfgWorkList);
+    m_pPropagation->appendCfgOutEdges(v, cfgWorkList);
 }
 
-void KvCControlFlowGraph::visitAssignment(KvCCfgAssignment* pAssignment, node v, list<edge>& cfgWorkList,
-                                          list<edge>& ssaWorkList, bool& changed) {
-  visitDefinition(pAssignment->getLHS(), *pAssignment->getRHS(), v, cfgWorkList, ssaWorkList, changed, true);
+void KvCControlFlowGraph::visitAssignment(KvCCfgAssignment* pAssignment, node v, EdgeWorkList& cfgWorkList,
+                                          EdgeWorkList& ssaWorkList, bool& changed) {
+  m_pPropagation->visitDefinition(pAssignment->getLHS(), *pAssignment->getRHS(), v, cfgWorkList, ssaWorkList,
+                                  changed, true);
 }
 
 // The statement combines the arguments of all calls of its procedure.
 void KvCControlFlowGraph::visitParamStatement(KvCCfgParamStatement* pStatement, node v,
-                                              list<edge>& cfgWorkList, list<edge>& ssaWorkList,
+                                              EdgeWorkList& cfgWorkList, EdgeWorkList& ssaWorkList,
                                               bool& changed) {
-  visitDefinition(pStatement->getVariable(), *pStatement, v, cfgWorkList, ssaWorkList, changed, true);
+  m_pPropagation->visitDefinition(pStatement->getVariable(), *pStatement, v, cfgWorkList, ssaWorkList,
+                                  changed, true);
 }
 
 void KvCControlFlowGraph::visitValueReturnStatement(KvCCfgValueReturnStatement* pStatement, node v,
-                                                    list<edge>& cfgWorkList, list<edge>& ssaWorkList,
+                                                    EdgeWorkList& cfgWorkList, EdgeWorkList& ssaWorkList,
                                                     bool& changed) {
-  visitDefinition(pStatement->getVariable(), *pStatement->getExpression(), v, cfgWorkList, ssaWorkList,
-                  changed, false);
-}
-
-// The variable's previous value object is the caller's once the new one is stored: it is compared
-// with the new value and then freed. Only a value going from undetermined to constant asks for
-// another pass; any change wakes the uses.
-template <class Definition>
-void KvCControlFlowGraph::visitDefinition(KvCCfgVariable* pVariable, const Definition& definition, node v,
-                                          list<edge>& cfgWorkList, list<edge>& ssaWorkList, bool& changed,
-                                          bool stores) {
-  DefinitionSnapshot before(*pVariable);
-  KvCCfgValue* pOld = pVariable->getValue();
-  KvCCfgValue value = definition.evaluate();
-  if (stores)
-    pVariable->setVarValueAndAdjustCfgValue(value);
-  else
-    pVariable->setVarValue(value);
-  recordRange(pVariable, definition);
-  if (!before.matches(*pVariable)) unsettleDefinitionAt(v);
-  if (pOld->compare(value) != 0) {
-    if (pOld->isUndetermined() && value.isConstant()) changed = true;
-    appendSSAOutEdges(v, ssaWorkList);
-  }
-  if (!value.isNonConstant()) appendCfgOutEdges(v, cfgWorkList);
-  delete pOld;
-}
-
-// The minimum is stored before the maximum is computed: a definition that reads its own variable
-// (a recursive call passing a parameter on) sees the new value in both bounds.
-template <class Definition>
-void KvCControlFlowGraph::recordRange(KvCCfgVariable* pVariable, const Definition& definition) {
-  KvCCfgValue minimum = definition.getMinimum();
-  pVariable->setMinValueAndDestroyOld(minimum);
-  KvCCfgValue maximum = definition.getMaximum();
-  pVariable->setMaxValueAndDestroyOld(maximum);
-  dropInvertedRange(*pVariable);
+  m_pPropagation->visitDefinition(pStatement->getVariable(), *pStatement->getExpression(), v, cfgWorkList,
+                                  ssaWorkList, changed, false);
 }
 
 // A constant comparing equal to 0.0 takes the false edge, every other constant the true edge;
 // undetermined and non-constant conditions open both.
-void KvCControlFlowGraph::visitBranchCondition(KvCCfgExpression* pCond, node v, list<edge>& cfgWorkList) {
+void KvCControlFlowGraph::visitBranchCondition(KvCCfgExpression* pCond, node v, EdgeWorkList& cfgWorkList) {
   KvCCfgValue condition = pCond->evaluate();
   if (!condition.isConstant()) {
-    appendCfgOutEdges(v, cfgWorkList);
+    m_pPropagation->appendCfgOutEdges(v, cfgWorkList);
     return;
   }
   bool taken = condition.getValue() != 0.0;
@@ -377,35 +489,27 @@ void KvCControlFlowGraph::visitBranchCondition(KvCCfgExpression* pCond, node v, 
   }
 }
 
-// All operands take part, whether the edge they come by is executable or not: an operand that is
-// still undetermined leaves the meet alone. Nothing is scheduled: the uses are reached by the flow
-// step or in the next pass. Unlike an assignment, any change to a constant asks for another pass.
-// A join of thousands of edges is merged again on every one of them that becomes executable, so the
-// merge reuses one list for the values and the two bounds. The operands hold values their
-// definitions already adjusted to the variable, so the meet is stored as it is.
+// All operands take part, whether the edge they come by is executable or not: one that is still
+// undetermined keeps the meet undetermined. Nothing is scheduled: the uses are reached by the flow
+// step or in the next pass. Unlike an assignment, any change to a constant asks for another pass. The
+// operands hold values their definitions already adjusted to the variable, so the meet is stored as
+// it is. (Merging the bounds before the value is stored gives what merging them after would: only an
+// operand without a range has its value for bounds, and storing the value of a phi function's own
+// variable without a range stores no range either.)
 void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node v, bool& changed) {
   KvCCfgVariable* pVariable = pPhi->getVariable();
   DefinitionSnapshot before(*pVariable);
   KvCCfgValue* pOld = pVariable->getValue();
-  ssaopt::array<KvCCfgVariable*> operands = distinctOperands(*pPhi);
-  list<KvCCfgValue*> merged(operands.size());
-  fillWith(merged, operands, [](KvCCfgVariable* pOperand) { return pOperand->getValue(); });
-  KvCCfgValue value = intersect(merged);
-  pVariable->setVarValue(value);
-  if (!pOld->isConstant() && value.isConstant()) changed = true;
-  fillWith(merged, operands,
-           [](KvCCfgVariable* pOperand) { return boundOf(pOperand->getMinValue(), *pOperand); });
-  KvCCfgValue minimum = determineMinimum(merged);
-  pVariable->setMinValueAndDestroyOld(minimum);
-  fillWith(merged, operands,
-           [](KvCCfgVariable* pOperand) { return boundOf(pOperand->getMaxValue(), *pOperand); });
-  KvCCfgValue maximum = determineMaximum(merged);
-  pVariable->setMaxValueAndDestroyOld(maximum);
-  if (!before.matches(*pVariable)) unsettleDefinitionAt(v);
+  PhiMerge::Result merged = m_pPropagation->mergeOperands(v, *pPhi);
+  pVariable->setVarValue(merged.value);
+  if (!pOld->isConstant() && merged.value.isConstant()) changed = true;
+  pVariable->setMinValueAndDestroyOld(merged.minimum);
+  pVariable->setMaxValueAndDestroyOld(merged.maximum);
+  if (!before.matches(*pVariable)) m_pPropagation->definitionChanged(v, *pVariable);
   delete pOld;
 }
 
-int KvCControlFlowGraph::countExecutableInEdges(node v) const { return m_ExecutableInEdges[v]; }
+int KvCControlFlowGraph::countExecutableInEdges(node v) const { return m_pPropagation->executableInEdges(v); }
 
 int KvCControlFlowGraph::countCfgOutEdges(node v) const {
   int count = 0;
@@ -413,22 +517,6 @@ int KvCControlFlowGraph::countCfgOutEdges(node v) const {
   return count;
 }
 
-void KvCControlFlowGraph::appendCfgOutEdges(node v, list<edge>& workList) const {
-  for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) workList.push_back(e);
-}
+void KvCControlFlowGraph::forgetDeadBlock(node n) { m_pPropagation->unsettleProceduresOfDeadBlock(n); }
 
-void KvCControlFlowGraph::appendSSAOutEdges(node v, list<edge>& workList) const {
-  for (edge e : out(v))
-    if (inf(e)->isSSAEdge()) workList.push_back(e);
-}
-
-// addSSAEdges adds a node's SSA out-edges after its control-flow out-edges, so the control-flow
-// edges end at the first SSA edge: a definition with thousands of uses costs a flow step no more
-// than a jump does.
-edge KvCControlFlowGraph::firstCfgOutEdge(node v) const { return controlFlowOrNil(first_adj_edge(v)); }
-
-edge KvCControlFlowGraph::nextCfgOutEdge(edge e) const { return controlFlowOrNil(adj_succ(e)); }
-
-edge KvCControlFlowGraph::controlFlowOrNil(edge e) const {
-  return e && !inf(e)->isSSAEdge() ? e : edge(ssaopt::nil);
-}
+void KvCControlFlowGraph::forgetPhiOperands(node link) { m_pPropagation->forgetMerge(link); }

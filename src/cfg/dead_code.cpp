@@ -6,119 +6,133 @@
 //   after:                                        B1 -> J,            J: x.3 = phi(x.1)
 //
 // Needs divided blocks and the visited marks of the pass that has just ended.
+#include <algorithm>
+
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/ir/statement.h"
 #include "ssaopt/ir/variable.h"
 
+using ssaopt::array;
 using ssaopt::edge;
 using ssaopt::nil;
 using ssaopt::node;
 
-namespace {
+class KvCControlFlowGraph::DeadCodeSweep {
+public:
+  explicit DeadCodeSweep(KvCControlFlowGraph& G) : m_G(G) {}
 
-// The variables at `positions` (ascending) of the operands `before` that no other operand names.
-ssaopt::set<KvCCfgVariable*> operandsNoLongerRead(const ssaopt::array<KvCCfgVariable*>& before,
-                                                  const ssaopt::array<int>& positions) {
-  ssaopt::set<KvCCfgVariable*> removed;
-  ssaopt::set<KvCCfgVariable*> kept;
-  auto nextRemoved = positions.begin();
-  for (std::size_t i = 0; i < before.size(); ++i) {
-    bool isRemoved = nextRemoved != positions.end() && static_cast<std::size_t>(*nextRemoved) == i;
-    (isRemoved ? removed : kept).insert(before[i]);
-    if (isRemoved) ++nextRemoved;
+  // Entry and exit nodes stay, reached or not.
+  bool isDeadBlock(node v) const { return !m_G.isVisited(v) && m_G.getBasicBlock(v); }
+
+  // A reached phi node that a control-flow edge of `v` leads to, or nil.
+  node reachedPhiSuccessor(node v) const {
+    for (edge e = m_G.firstCfgOutEdge(v); e; e = m_G.nextCfgOutEdge(e)) {
+      node t = m_G.target(e);
+      if (m_G.isVisited(t) && phiFunctionAt(t)) return t;
+    }
+    return nil;
   }
-  for (KvCCfgVariable* pVariable : kept) removed.erase(pVariable);
-  removed.erase(nullptr);
-  return removed;
-}
 
-}  // namespace
+  // The operands stand in the order of t's control-flow in-edges. One walk over them finds every
+  // edge from a dead block, so a phi node that many dead blocks lead to costs one walk, and a dead
+  // block with two edges into it loses both operands, not one operand of a live edge.
+  void removeDeadOperands(node t) {
+    removeDeadInEdges(t);
+    for (node link = t; KvCPhiFunction* pPhi = phiFunctionAt(link); link = nextPhiChainLink(link)) {
+      removeOperands(link, *pPhi);
+      m_G.forgetPhiOperands(link);
+    }
+  }
+
+  // No use set may keep the node, and no payload slot the block.
+  void destroyDeadBlock(node n) {
+    KvCBasicBlock* pBlock = m_G.getBasicBlock(n);
+    for (KvCCfgVariable* pVariable : pBlock->getUsedVariables()) pVariable->delUse(n);
+    while (!pBlock->getPhiFunctions().empty())
+      m_G.deleteStatement(*pBlock, pBlock->getPhiFunctions().front());
+    while (!pBlock->getStatementSeq().empty())
+      m_G.deleteStatement(*pBlock, pBlock->getStatementSeq().front());
+    m_G.assign(n, nullptr);
+    delete pBlock;
+    m_G.del_node(n);
+  }
+
+private:
+  KvCPhiFunction* phiFunctionAt(node v) const {
+    KvCBasicBlock* pBlock = v ? m_G.getBasicBlock(v) : nullptr;
+    return pBlock ? pBlock->isPhiFunction() : nullptr;
+  }
+
+  // Notes the positions, among t's control-flow in-edges, of those that come from dead blocks, in
+  // ascending order; the edges go.
+  void removeDeadInEdges(node t) {
+    m_Positions.clear();
+    int position = 0;
+    for (edge e : m_G.in(t)) {
+      if (m_G.inf(e)->isSSAEdge()) continue;
+      if (isDeadBlock(m_G.source(e))) {
+        m_Positions.push_back(position);
+        m_G.del_edge(e);
+      }
+      ++position;
+    }
+  }
+
+  // Every phi function of the block that divideBasicBlock cut into the chain starting at t has one
+  // operand per in-edge of t. The walk follows only the links it made: a block that held nothing but
+  // phi functions is followed by another join, whose phi functions belong to other edges.
+  node nextPhiChainLink(node link) const {
+    edge next = m_G.firstCfgOutEdge(link);
+    return next && m_G.m_DividedBlockLinks[next] ? m_G.target(next) : nil;
+  }
+
+  // In one sweep: the operands that stay move to the front in their order, and the last places go,
+  // each in constant time. A variable that no operand names any more is no longer used at `link`: its
+  // use set must say so, or a definition that only this operand read would never count as unused.
+  void removeOperands(node link, KvCPhiFunction& phi) {
+    m_Kept.clear();
+    m_Removed.clear();
+    const array<KvCCfgVariable*>& operands = phi.replacementVariables();
+    auto nextRemoved = m_Positions.begin();
+    for (std::size_t i = 0; i < operands.size(); ++i) {
+      bool removed = nextRemoved != m_Positions.end() && static_cast<std::size_t>(*nextRemoved) == i;
+      (removed ? m_Removed : m_Kept).push_back(operands[i]);
+      if (removed) ++nextRemoved;
+    }
+    for (std::size_t i = 0; i < m_Kept.size(); ++i)
+      phi.setReplacementVariable(static_cast<int>(i), m_Kept[i]);
+    for (std::size_t i = 0; i < m_Removed.size(); ++i) phi.delReplacement(phi.getDimension() - 1);
+    dropUsesNoLongerRead(link);
+  }
+
+  void dropUsesNoLongerRead(node link) {
+    ssaopt::set_order<KvCCfgVariable*> order;
+    std::sort(m_Kept.begin(), m_Kept.end(), order);
+    std::sort(m_Removed.begin(), m_Removed.end(), order);
+    m_Removed.erase(std::unique(m_Removed.begin(), m_Removed.end()), m_Removed.end());
+    for (KvCCfgVariable* pVariable : m_Removed)
+      if (pVariable && !std::binary_search(m_Kept.begin(), m_Kept.end(), pVariable, order))
+        pVariable->delUse(link);
+  }
+
+  KvCControlFlowGraph& m_G;
+  array<int> m_Positions;
+  array<KvCCfgVariable*> m_Kept, m_Removed;
+};
 
 // Deleting the node in hand is all that happens to the node list, so the live view serves.
 bool KvCControlFlowGraph::eliminateDeadCode() {
+  DeadCodeSweep sweep(*this);
   bool removedOperand = false;
   for (node n : nodes()) {
-    if (!isDeadBlock(n)) continue;
-    unsettleProceduresOfDeadBlock(n);
-    while (node t = reachedPhiSuccessor(n)) {
-      removeDeadOperands(t);
+    if (!sweep.isDeadBlock(n)) continue;
+    forgetDeadBlock(n);
+    while (node t = sweep.reachedPhiSuccessor(n)) {
+      sweep.removeDeadOperands(t);
       removedOperand = true;
     }
-    destroyDeadBlock(n);
+    sweep.destroyDeadBlock(n);
   }
   forgetDeletedStatements();
   return removedOperand;
 }
-
-// Entry and exit nodes stay, reached or not.
-bool KvCControlFlowGraph::isDeadBlock(node v) const { return !isVisited(v) && getBasicBlock(v); }
-
-node KvCControlFlowGraph::reachedPhiSuccessor(node v) const {
-  for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) {
-    node t = target(e);
-    if (isVisited(t) && phiFunctionAt(t)) return t;
-  }
-  return nil;
-}
-
-KvCPhiFunction* KvCControlFlowGraph::phiFunctionAt(node v) const {
-  KvCBasicBlock* pBlock = v ? getBasicBlock(v) : nullptr;
-  return pBlock ? pBlock->isPhiFunction() : nullptr;
-}
-
-// The operands stand in the order of t's control-flow in-edges. One walk over them finds every edge
-// from a dead block, so a phi node that many dead blocks lead to costs one walk, and a dead block with
-// two edges into it loses both operands, not one operand of a live edge.
-void KvCControlFlowGraph::removeDeadOperands(node t) {
-  ssaopt::array<int> positions = removeDeadInEdges(t);
-  for (node link = t; KvCPhiFunction* pPhi = phiFunctionAt(link); link = nextPhiChainLink(link))
-    removeOperands(link, *pPhi, positions);
-}
-
-// The positions, among t's control-flow in-edges, of those that come from dead blocks, in ascending
-// order; the edges go.
-ssaopt::array<int> KvCControlFlowGraph::removeDeadInEdges(node t) {
-  ssaopt::array<int> positions;
-  int position = 0;
-  for (edge e : in(t)) {
-    if (inf(e)->isSSAEdge()) continue;
-    if (isDeadBlock(source(e))) {
-      positions.push_back(position);
-      del_edge(e);
-    }
-    ++position;
-  }
-  return positions;
-}
-
-// Every phi function of the block that divideBasicBlock cut into the chain starting at t has one
-// operand per in-edge of t. The walk follows only the links it made: a block that held nothing but
-// phi functions is followed by another join, whose phi functions belong to other edges.
-node KvCControlFlowGraph::nextPhiChainLink(node link) const {
-  edge next = firstCfgOutEdge(link);
-  return next && isDividedBlockLink(next) ? target(next) : nil;
-}
-
-// From the back, so that each position still names the operand it named before. A variable that no
-// operand names any more is no longer used at `link`: its use set must say so, or a definition that
-// only this operand read would never count as unused.
-void KvCControlFlowGraph::removeOperands(node link, KvCPhiFunction& phi,
-                                         const ssaopt::array<int>& positions) {
-  ssaopt::array<KvCCfgVariable*> before = phi.getReplacementVariables();
-  for (auto position = positions.rbegin(); position != positions.rend(); ++position)
-    phi.delReplacement(*position);
-  for (KvCCfgVariable* pVariable : operandsNoLongerRead(before, positions)) pVariable->delUse(link);
-}
-
-// No use set may keep the node, and no payload slot the block.
-void KvCControlFlowGraph::destroyDeadBlock(node n) {
-  KvCBasicBlock* pBlock = getBasicBlock(n);
-  for (KvCCfgVariable* pVariable : pBlock->getUsedVariables()) pVariable->delUse(n);
-  while (!pBlock->getPhiFunctions().empty()) deleteStatement(*pBlock, pBlock->getPhiFunctions().front());
-  while (!pBlock->getStatementSeq().empty()) deleteStatement(*pBlock, pBlock->getStatementSeq().front());
-  assign(n, nullptr);
-  delete pBlock;
-  del_node(n);
-}
-
-bool KvCControlFlowGraph::isDividedBlockLink(edge e) const { return m_DividedBlockLinks[e]; }

@@ -14,6 +14,7 @@
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/frame/graph_algorithms.h"
 #include "ssaopt/frame/report.h"
+#include "ssaopt/ir/edge_info.h"
 #include "ssaopt/ir/procedure.h"
 #include "ssaopt/ir/statement.h"
 
@@ -57,6 +58,10 @@ list<KvCBasicBlock*> oneItemBlocks(const KvCBasicBlock& block) {
   for (KvCCfgStatement* pStatement : block.getStatementSeq()) newLink()->append(pStatement);
   if (KvCCfgExpression* pCond = block.getBranchCond()) newLink()->appendBranch(pCond);
   return links;
+}
+
+edge controlFlowOrNil(const KvCControlFlowGraph& G, edge e) {
+  return e && !G.inf(e)->isSSAEdge() ? e : edge(nil);
 }
 
 KvCCfgProcedureCall* lastCallOf(const KvCBasicBlock& block) {
@@ -110,6 +115,13 @@ void KvCControlFlowGraph::forgetDeletedStatements() {
   for (const auto& entry : m_Procedures) entry.second->forgetStatements(m_DeletedStatements);
   m_DeletedStatements.clear();
 }
+
+// addSSAEdges adds a node's SSA out-edges after its control-flow out-edges, so the control-flow
+// edges end at the first SSA edge: a definition with thousands of uses costs a walk over the
+// control flow no more than a jump does.
+edge KvCControlFlowGraph::firstCfgOutEdge(node v) const { return controlFlowOrNil(*this, first_adj_edge(v)); }
+
+edge KvCControlFlowGraph::nextCfgOutEdge(edge e) const { return controlFlowOrNil(*this, adj_succ(e)); }
 
 // ---- The graph object ----------------------------------------------------------------------------
 

@@ -122,36 +122,31 @@ int KvCCfgVariable::countAllUses() const {
   return count;
 }
 
-KvCSSAVariable::KvCSSAVariable(KvCCfgVariable* var)
-    : m_pMinValue(new KvCCfgValue()), m_pMaxValue(new KvCCfgValue()) {
+KvCSSAVariable::KvCSSAVariable(KvCCfgVariable* var) {
   setOrigVar(var);
   if (var->isArray()) markAsArray();
   if (var->isErasable()) markAsErasable();
   if (var->isVolatile()) markAsVolatile();
 }
 
-KvCSSAVariable::~KvCSSAVariable() {
-  delete m_pMinValue;
-  delete m_pMaxValue;
-}
+KvCSSAVariable::~KvCSSAVariable() = default;
 
 void KvCSSAVariable::setOrigVar(KvCCfgVariable* var) {
   KvCSSAVariable* pVersion = var->isSSAVariable();
   m_pOrigVar = pVersion ? pVersion->getOrigVar() : var;
 }
 
-void KvCSSAVariable::setMinValueAndDestroyOld(KvCCfgValue& value) { replaceBound(m_pMinValue, value); }
+void KvCSSAVariable::setMinValueAndDestroyOld(KvCCfgValue& value) { replaceBound(m_MinValue, value); }
 
-void KvCSSAVariable::setMaxValueAndDestroyOld(KvCCfgValue& value) { replaceBound(m_pMaxValue, value); }
+void KvCSSAVariable::setMaxValueAndDestroyOld(KvCCfgValue& value) { replaceBound(m_MaxValue, value); }
 
-void KvCSSAVariable::replaceBound(KvCCfgValue*& pBound, const KvCCfgValue& value) {
-  delete pBound;
+void KvCSSAVariable::replaceBound(KvCCfgValue& bound, const KvCCfgValue& value) {
   if (isNeverConstant()) {
-    pBound = new KvCCfgValue(eCfgNonConstant);
+    bound = KvCCfgValue(eCfgNonConstant);
     return;
   }
-  pBound = value.clone();
-  fitConstant(*pBound);
+  bound = value;
+  fitConstant(bound);
 }
 
 const KV_DataType* KvCSSAVariable::getDataType() const { return m_pOrigVar->getDataType(); }

@@ -181,6 +181,9 @@ private:
   // Takes every statement deleted since the last call out of every procedure record, so that no
   // record points to freed memory.
   void forgetDeletedStatements();
+  // The control-flow out-edges of `v` in adjacency order (SSA edges excluded); nil after the last.
+  ssaopt::edge firstCfgOutEdge(ssaopt::node v) const;
+  ssaopt::edge nextCfgOutEdge(ssaopt::edge e) const;
 
   // ---- Block surgery (graph.cpp) ---------------------------------------------------------------
 
@@ -327,99 +330,42 @@ private:
 
   // ---- Sparse conditional constant propagation (constant_propagation.cpp) ----------------------
 
-  void buildVarUses();
-  void startPropagationRecord();
-  void visitProcedure(int procedure, ssaopt::list<ssaopt::edge>& cfgWorkList,
-                      ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
-  void propagateFrom(ssaopt::node entry, ssaopt::list<ssaopt::edge>& cfgWorkList,
-                     ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
-  // A definition at `v` now holds another value or range: its procedure and the procedures of its
-  // uses are visited again in the next pass.
-  void unsettleDefinitionAt(ssaopt::node v);
-  void unsettleProcedureOf(ssaopt::node v);
-  // Dead-code elimination is about to delete `n`: its procedure changes, and so does every procedure
-  // that a call in it passes arguments to.
-  void unsettleProceduresOfDeadBlock(ssaopt::node n);
-  void initSparseConditionalConstant(ssaopt::node entry, ssaopt::list<ssaopt::edge>& cfgWorkList,
-                                     ssaopt::list<ssaopt::edge>& ssaWorkList);
-  void flowStep(ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
-                bool& changed);
-  void ssaStep(ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
-               bool& changed);
-  void visitInstruction(KvCBasicBlock* pBasicBlock, ssaopt::node v, ssaopt::list<ssaopt::edge>& cfgWorkList,
-                        ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
-  void visitAssignment(KvCCfgAssignment* pAssignment, ssaopt::node v, ssaopt::list<ssaopt::edge>& cfgWorkList,
-                       ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
-  void visitBranchCondition(KvCCfgExpression* pCond, ssaopt::node v, ssaopt::list<ssaopt::edge>& cfgWorkList);
-  void visitParamStatement(KvCCfgParamStatement* pStatement, ssaopt::node v,
-                           ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
-                           bool& changed);
-  void visitValueReturnStatement(KvCCfgValueReturnStatement* pStatement, ssaopt::node v,
-                                 ssaopt::list<ssaopt::edge>& cfgWorkList,
-                                 ssaopt::list<ssaopt::edge>& ssaWorkList, bool& changed);
-  // The visit shared by assignments, parameter and value-return statements: `definition` gives the
-  // new value, minimum and maximum of `pVariable`. `stores` is false where no store happens (a
-  // value-return statement takes back a value the variable already holds), so the value is not
-  // adjusted to the variable a second time.
-  template <class Definition>
-  void visitDefinition(KvCCfgVariable* pVariable, const Definition& definition, ssaopt::node v,
-                       ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
-                       bool& changed, bool stores);
-  template <class Definition>
-  void recordRange(KvCCfgVariable* pVariable, const Definition& definition);
-  void visitPhiFunction(KvCPhiFunction* pPhi, ssaopt::node v, bool& changed);
+  // The work lists of a propagation: first in, first out.
+  using EdgeWorkList = ssaopt::queue<ssaopt::edge>;
 
+  // What one call of sparseConditionalConstant keeps while it runs: which procedures need another
+  // visit, which edges carry the executable flag, and the merges of the phi functions. It lives on
+  // that call's stack; m_pPropagation names it meanwhile and is null otherwise.
+  class PropagationRun;
+  PropagationRun* m_pPropagation = nullptr;
+
+  void buildVarUses();
+  void initSparseConditionalConstant(ssaopt::node entry, EdgeWorkList& cfgWorkList,
+                                     EdgeWorkList& ssaWorkList);
+  void visitInstruction(KvCBasicBlock* pBasicBlock, ssaopt::node v, EdgeWorkList& cfgWorkList,
+                        EdgeWorkList& ssaWorkList, bool& changed);
+  void visitAssignment(KvCCfgAssignment* pAssignment, ssaopt::node v, EdgeWorkList& cfgWorkList,
+                       EdgeWorkList& ssaWorkList, bool& changed);
+  void visitBranchCondition(KvCCfgExpression* pCond, ssaopt::node v, EdgeWorkList& cfgWorkList);
+  void visitParamStatement(KvCCfgParamStatement* pStatement, ssaopt::node v, EdgeWorkList& cfgWorkList,
+                           EdgeWorkList& ssaWorkList, bool& changed);
+  void visitValueReturnStatement(KvCCfgValueReturnStatement* pStatement, ssaopt::node v,
+                                 EdgeWorkList& cfgWorkList, EdgeWorkList& ssaWorkList, bool& changed);
+  void visitPhiFunction(KvCPhiFunction* pPhi, ssaopt::node v, bool& changed);
   int countExecutableInEdges(ssaopt::node v) const;
   int countCfgOutEdges(ssaopt::node v) const;
-  void appendCfgOutEdges(ssaopt::node v, ssaopt::list<ssaopt::edge>& workList) const;
-  void appendSSAOutEdges(ssaopt::node v, ssaopt::list<ssaopt::edge>& workList) const;
-  // The control-flow out-edges of `v`, in adjacency order; nil after the last.
-  ssaopt::edge firstCfgOutEdge(ssaopt::node v) const;
-  ssaopt::edge nextCfgOutEdge(ssaopt::edge e) const;
-  ssaopt::edge controlFlowOrNil(ssaopt::edge e) const;
-
-  void activateEdge(ssaopt::edge e);
-  void deactivateExecutableEdges();
-  void deactivateAllEdges();
-
-  // The edges whose executable flag the current pass set since the last clearing, so that the next
-  // procedure clears only those instead of every edge of the graph. Empty outside propagation.
-  ssaopt::list<ssaopt::edge> m_ExecutableEdges;
-  // Per node, how many in-edges carry the executable flag. The flow step asks at every edge that
-  // becomes executable; counting at a join with many in-edges each time would be quadratic.
-  ssaopt::node_array<int> m_ExecutableInEdges;
-
-  // What propagation keeps between its passes so that a pass visits again only the procedures whose
-  // visit could come out differently: a visit is a function of the procedure's own values, ranges and
-  // blocks and of the values and ranges it reads through SSA edges from other procedures, so a
-  // procedure whose last visit changed none of its definitions, and none of whose inputs changed
-  // since, would repeat that visit exactly. Procedures are numbered by their position in the table.
-  struct PropagationRecord {
-    ssaopt::node_array<int> procedureOf;  // -1 for a node that no entry reaches
-    ssaopt::array<bool> unsettled;        // per procedure: to be visited in the next pass
-    // Per procedure, the nodes its last visit marked visited: a visit clears its own marks only, so
-    // that the marks of the procedures a pass passes over stay for dead-code elimination.
-    ssaopt::array<ssaopt::array<ssaopt::node>> visitedBy;
-    ssaopt::array<ssaopt::node> entries;  // per procedure
-    int current = -1;                     // the procedure being visited
-  };
-  PropagationRecord m_Propagation;
+  // Dead-code elimination tells the propagation in progress what it changes: a block it is about to
+  // delete, and a phi function that lost operands.
+  void forgetDeadBlock(ssaopt::node n);
+  void forgetPhiOperands(ssaopt::node link);
 
   // ---- Dead-code elimination (dead_code.cpp) ---------------------------------------------------
 
   // Deletes the blocks that the last pass did not reach with their phi operands elsewhere; true when
   // a phi operand was removed.
   bool eliminateDeadCode();
-  bool isDeadBlock(ssaopt::node v) const;
-  // A reached phi node that a control-flow edge of `v` leads to, or nil.
-  ssaopt::node reachedPhiSuccessor(ssaopt::node v) const;
-  KvCPhiFunction* phiFunctionAt(ssaopt::node v) const;
-  void removeDeadOperands(ssaopt::node t);
-  ssaopt::array<int> removeDeadInEdges(ssaopt::node t);
-  ssaopt::node nextPhiChainLink(ssaopt::node link) const;
-  void removeOperands(ssaopt::node link, KvCPhiFunction& phi, const ssaopt::array<int>& positions);
-  void destroyDeadBlock(ssaopt::node n);
-  bool isDividedBlockLink(ssaopt::edge e) const;
+  // The deletion of one dead block and of the phi operands of its edges.
+  class DeadCodeSweep;
 
   // The edges that divideBasicBlock made between the pieces of one block. The operand removal walks
   // a chain of phi nodes along these only, never on into the next block.

@@ -73,6 +73,42 @@ private:
   array<T> m_Items;
 };
 
+// First-in first-out queue on a growable array: no allocation per element, unlike a list. The slots
+// before the front are given up once they are the larger part, so a queue that never empties keeps
+// at most twice what it holds (and each element is moved at most once on average).
+template <class T>
+class queue {
+public:
+  void push_back(const T& x) { m_Items.push_back(x); }
+  // The queue must not be empty.
+  const T& front() const { return m_Items[m_Front]; }
+  T pop_front() {
+    T first = m_Items[m_Front++];
+    if (m_Front == m_Items.size())
+      clear();
+    else if (m_Front >= kCompactAfter && 2 * m_Front >= m_Items.size())
+      compact();
+    return first;
+  }
+  bool empty() const { return m_Front == m_Items.size(); }
+  std::size_t size() const { return m_Items.size() - m_Front; }
+  void clear() {
+    m_Items.clear();
+    m_Front = 0;
+  }
+
+private:
+  static constexpr std::size_t kCompactAfter = 1024;
+
+  void compact() {
+    m_Items.erase(m_Items.begin(), m_Items.begin() + static_cast<std::ptrdiff_t>(m_Front));
+    m_Front = 0;
+  }
+
+  array<T> m_Items;
+  std::size_t m_Front = 0;
+};
+
 // Hash map on a pointer or integer key that iterates in insertion order. Reading a key with
 // operator[] creates the entry with a default value, as the library's algorithms expect.
 template <class K, class V, class Hash = std::hash<K>>

@@ -151,6 +151,8 @@ public:
   // An index outside 0..dimension-1 is reported and writes nothing.
   void setReplacementVariable(int i, KvCCfgVariable* v);
   ssaopt::array<KvCCfgVariable*> getReplacementVariables() const { return m_pReplacementVariable; }
+  // The same without a copy, for the walks that visit a phi function again and again.
+  const ssaopt::array<KvCCfgVariable*>& replacementVariables() const { return m_pReplacementVariable; }
   // Removes operand i, keeping the order of the others, when in-edge i of the block goes. An index
   // outside the operands is reported and changes nothing.
   void delReplacement(int i);

@@ -86,6 +86,8 @@ public:
   // Removes `v` from the uses and returns how many are left.
   int delUse(ssaopt::node v);
   ssaopt::set<ssaopt::node> getUses() const { return m_Uses; }
+  // The same without a copy.
+  const ssaopt::set<ssaopt::node>& uses() const { return m_Uses; }
   int countUses() const { return static_cast<int>(m_Uses.size()); }
   void clearUses() { m_Uses.clear(); }
   // The uses of this variable and of its virtual aliases (one level).
@@ -125,8 +127,9 @@ public:
   // Replace the bound by a copy of `value` adjusted to the variable; `value` itself stays unchanged.
   void setMinValueAndDestroyOld(KvCCfgValue& value) override;
   void setMaxValueAndDestroyOld(KvCCfgValue& value) override;
-  KvCCfgValue* getMinValue() const override { return m_pMinValue; }
-  KvCCfgValue* getMaxValue() const override { return m_pMaxValue; }
+  // The bounds live in the variable itself, and a pointer to one stays valid for the variable's life.
+  KvCCfgValue* getMinValue() const override { return &m_MinValue; }
+  KvCCfgValue* getMaxValue() const override { return &m_MaxValue; }
   // The client's questions go to the original variable.
   const KV_DataType* getDataType() const override;
   const KV_Scaling* getScaling() const override;
@@ -141,9 +144,10 @@ public:
   KvCCfgVariable* getOrigVar() const { return m_pOrigVar; }
 
 private:
-  void replaceBound(KvCCfgValue*& pBound, const KvCCfgValue& value);
+  void replaceBound(KvCCfgValue& bound, const KvCCfgValue& value);
 
   KvCCfgVariable* m_pOrigVar = nullptr;
-  KvCCfgValue* m_pMinValue;
-  KvCCfgValue* m_pMaxValue;
+  // Mutable: the getters hand out pointers through which callers may write, as to the current value.
+  mutable KvCCfgValue m_MinValue;
+  mutable KvCCfgValue m_MaxValue;
 };
