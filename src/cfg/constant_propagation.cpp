@@ -19,6 +19,7 @@
 #include "ssaopt/ir/statement.h"
 #include "ssaopt/ir/variable.h"
 #include "ssaopt/values/arithmetic.h"
+#include "variable_table.h"
 
 using ssaopt::array;
 using ssaopt::edge;
@@ -100,7 +101,7 @@ void forEachUsedVariable(KvCCfgNodeInfo& payload, OnUse onUse) {
 // A phi node is visited on every edge into it that becomes executable and after every change of an
 // operand. Its merge (PhiMerge) is made at its first visit and kept until dead-code elimination takes
 // operands away; a merge of many operands reads again only the blocks of operands that changed,
-// which every definition that changes tells it through the registrations of its variable.
+// which every definition that changes tells it.
 class KvCControlFlowGraph::PropagationRun {
 public:
   explicit PropagationRun(KvCControlFlowGraph& G) : m_G(G) { m_G.m_pPropagation = this; }
@@ -184,13 +185,8 @@ public:
     unsettleProcedureOf(v);
     for (edge e : m_G.out(v))
       if (m_G.inf(e)->isSSAEdge()) unsettleProcedureOf(m_G.target(e));
-    std::size_t index = variable.getIndex();
-    if (index >= m_FirstRegistration.size()) return;
-    for (int r = m_FirstRegistration[index]; r != kNone;
-         r = m_Registrations[static_cast<std::size_t>(r)].next) {
-      const Registration& registration = m_Registrations[static_cast<std::size_t>(r)];
-      if (registration.pVariable == &variable) m_Merges[registration.merge].invalidate(registration.block);
-    }
+    m_Readers.forEach(variable,
+                      [this](const Reader& reader) { m_Merges[reader.merge].invalidate(reader.block); });
   }
 
   void appendCfgOutEdges(node v, EdgeWorkList& workList) const {
@@ -241,13 +237,10 @@ private:
   static constexpr int kNone = -1;
   static constexpr std::size_t kMergedFromScratch = 2;
 
-  // An operand of an incremental merge: the variable, the merge and the block of its operands that
-  // holds it, and the next registration of a variable with the same index.
-  struct Registration {
-    const KvCCfgVariable* pVariable;
+  // Where an incremental merge reads a variable: the merge, and the block of its operands.
+  struct Reader {
     std::size_t merge;
     std::size_t block;
-    int next;
   };
 
   // Gives every node the number of the procedure whose entry reaches it along control-flow edges
@@ -355,16 +348,10 @@ private:
     dropInvertedRange(*pVariable);
   }
 
-  // Chains the registrations of every operand of merge `merge` to its variable's index.
   void registerOperands(std::size_t merge) {
     const PhiMerge& phiMerge = m_Merges[merge];
-    for (std::size_t i = 0; i < phiMerge.operands().size(); ++i) {
-      const KvCCfgVariable* pOperand = phiMerge.operands()[i];
-      std::size_t index = pOperand->getIndex();
-      if (index >= m_FirstRegistration.size()) m_FirstRegistration.resize(index + 1, kNone);
-      m_Registrations.push_back({pOperand, merge, phiMerge.blockOf(i), m_FirstRegistration[index]});
-      m_FirstRegistration[index] = static_cast<int>(m_Registrations.size() - 1);
-    }
+    for (std::size_t i = 0; i < phiMerge.operands().size(); ++i)
+      m_Readers.insert(*phiMerge.operands()[i], {merge, phiMerge.blockOf(i)});
   }
 
   KvCControlFlowGraph& m_G;
@@ -385,12 +372,10 @@ private:
   array<edge> m_ExecutableEdges;
   ssaopt::node_array<int> m_ExecutableInEdges;
 
-  // The merges kept for phi functions of many operands, by node, and the registrations of their
-  // operands: the first per variable index, and each one's successor.
+  // The merges kept for phi functions, by node, and where the incremental ones read each variable.
   ssaopt::node_array<int> m_MergeAt;
   array<PhiMerge> m_Merges;
-  array<int> m_FirstRegistration;
-  array<Registration> m_Registrations;
+  ssaopt::cfg::VariableTable<Reader> m_Readers;
   array<KvCCfgVariable*> m_Operands;  // scratch
 };
 

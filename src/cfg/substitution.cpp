@@ -15,6 +15,7 @@
 #include "ssaopt/ir/expression.h"
 #include "ssaopt/ir/statement.h"
 #include "ssaopt/ir/variable.h"
+#include "variable_table.h"
 
 using ssaopt::node;
 
@@ -73,34 +74,67 @@ void KvCControlFlowGraph::foldConstants() {
       [](KvCCfgExpression& cond) { cond.foldConstants(); });
 }
 
+// One pass over all nodes in node order, then a work list: a definition becomes unused only when a
+// use of its variable, or of a virtual alias of it, goes, and the removal of the reading statement
+// wakes it then. Uses only ever go, so once unused a definition stays unused, and the definitions
+// removed are those that repeating whole passes until nothing changes would remove.
+class KvCControlFlowGraph::UnusedDefinitionRemoval {
+public:
+  explicit UnusedDefinitionRemoval(KvCControlFlowGraph& G) : m_G(G) {}
+
+  void run() {
+    for (node v : m_G.nodes()) removeDefinitionIfUnused(v, true);
+    while (!m_Woken.empty()) removeDefinitionIfUnused(m_Woken.pop_front(), false);
+  }
+
+private:
+  // The block stays, emptied of its statement. On the first pass every definition is noted, with the
+  // variables whose virtual alias its variable is.
+  void removeDefinitionIfUnused(node v, bool firstPass) {
+    KvCCfgNodeInfo* pInf = m_G.inf(v);
+    if (!pInf) {
+      reportInternalFault(kLineRemoveUnusedNoPayload);
+      return;
+    }
+    KvCBasicBlock* pBlock = pInf->isBasicBlock();
+    KvCCfgStatement* pStatement = pBlock ? onlyDefinitionOf(*pBlock) : nullptr;
+    if (!pStatement) return;
+    ssaopt::set<KvCCfgVariable*> defined = pStatement->getDefinedVariables();
+    KV_CONSISTENCY_CHECK(defined.size() <= 1, "DefinedVariables.size() <= 1", kClassName,
+                         kLineRemoveUnusedDefinesSeveral);
+    if (defined.size() != 1) return;
+    KvCCfgVariable& variable = **defined.begin();
+    if (firstPass) note(variable, v);
+    if (!isUnusedDefinition(*pStatement, variable)) return;
+    for (KvCCfgVariable* pUsed : pStatement->getUsedVariables())
+      if (pUsed->delUse(v) == 0) wakeDefinitionsOf(*pUsed);
+    m_G.deleteStatement(*pBlock, pStatement);
+  }
+
+  void note(KvCCfgVariable& variable, node v) {
+    m_Definitions.insert(variable, v);
+    for (KvCCfgVariable* pAlias : variable.virtualAliases()) m_AliasOwners.insert(*pAlias, &variable);
+  }
+
+  // `variable` has no use left: its definitions, and those of the variables it is a virtual alias of,
+  // may have become unused. Those the first pass has not met yet it will meet.
+  void wakeDefinitionsOf(const KvCCfgVariable& variable) {
+    m_Definitions.forEach(variable, [this](node v) { m_Woken.push_back(v); });
+    m_AliasOwners.forEach(variable, [this](const KvCCfgVariable* pOwner) {
+      m_Definitions.forEach(*pOwner, [this](node v) { m_Woken.push_back(v); });
+    });
+  }
+
+  KvCControlFlowGraph& m_G;
+  ssaopt::cfg::VariableTable<node> m_Definitions;
+  ssaopt::cfg::VariableTable<const KvCCfgVariable*> m_AliasOwners;
+  ssaopt::queue<node> m_Woken;
+};
+
 // The use sets are rebuilt once and then kept by hand. A definition that loses the last use of a
-// variable it reads lets that variable's definition go too: in the same pass when that comes later
-// in node order, else in the next one.
+// variable it reads lets that variable's definition go too, and so on down the chain.
 void KvCControlFlowGraph::removeUnusedVarDefs() {
   buildVarUses();
-  bool again = true;
-  while (again) {
-    again = false;
-    for (node v : nodes()) removeDefinitionIfUnused(v, again);
-  }
+  UnusedDefinitionRemoval(*this).run();
   forgetDeletedStatements();
-}
-
-// The block stays, emptied of its statement.
-void KvCControlFlowGraph::removeDefinitionIfUnused(node v, bool& again) {
-  KvCCfgNodeInfo* pInf = inf(v);
-  if (!pInf) {
-    reportInternalFault(kLineRemoveUnusedNoPayload);
-    return;
-  }
-  KvCBasicBlock* pBlock = pInf->isBasicBlock();
-  KvCCfgStatement* pStatement = pBlock ? onlyDefinitionOf(*pBlock) : nullptr;
-  if (!pStatement) return;
-  ssaopt::set<KvCCfgVariable*> defined = pStatement->getDefinedVariables();
-  KV_CONSISTENCY_CHECK(defined.size() <= 1, "DefinedVariables.size() <= 1", kClassName,
-                       kLineRemoveUnusedDefinesSeveral);
-  if (defined.size() != 1 || !isUnusedDefinition(*pStatement, **defined.begin())) return;
-  for (KvCCfgVariable* pUsed : pStatement->getUsedVariables())
-    if (pUsed->delUse(v) == 0) again = true;
-  deleteStatement(*pBlock, pStatement);
 }

@@ -373,5 +373,5 @@ private:
 
   // ---- Constant substitution, folding and unused definitions (substitution.cpp) ---------------
 
-  void removeDefinitionIfUnused(ssaopt::node v, bool& again);
+  class UnusedDefinitionRemoval;
 };

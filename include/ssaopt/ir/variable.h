@@ -73,6 +73,7 @@ public:
   KvCCfgVariable* getNonVirtualAlias() const { return m_pNonVirtualAlias; }
   void setNonVirtualAlias(KvCCfgVariable* pAlias) { m_pNonVirtualAlias = pAlias; }
   void appendVirtualAlias(KvCCfgVariable* pAlias) { m_VirtualAliases.insert(pAlias); }
+  const ssaopt::set<KvCCfgVariable*>& virtualAliases() const { return m_VirtualAliases; }
 
   // Array and volatile variables are never constant: marking one drops its current value.
   bool isArray() const { return m_IsArray; }
