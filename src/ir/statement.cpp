@@ -8,7 +8,7 @@
 #include "ssaopt/frame/control.h"
 #include "ssaopt/frame/report.h"
 #include "ssaopt/ir/expression.h"
-#include "ssaopt/values/arithmetic.h"
+#include "ssaopt/values/merge.h"
 
 namespace {
 
@@ -26,18 +26,15 @@ ssaopt::set<KvCCfgVariable*> usedVariablesOf(const KvCCfgExpression* pExpression
   return pExpression ? pExpression->getUsedVariables() : ssaopt::set<KvCCfgVariable*>();
 }
 
-// Asks every argument that is there the same question and combines the answers with one of the list
-// merges. No argument at all gives the merge of an empty list, which is undetermined.
-template <class Combine>
+// Asks every argument that is there the same question and merges the answers in argument order. No
+// argument at all gives the merge of nothing, which is undetermined.
+template <class Fold>
 KvCCfgValue combineArguments(const KvCCfgParamStatement::Arguments& arguments,
-                             KvCCfgValue (KvCCfgExpression::*ask)() const, Combine combine) {
-  ssaopt::array<KvCCfgValue> values;
-  values.reserve(arguments.size());
+                             KvCCfgValue (KvCCfgExpression::*ask)() const) {
+  Fold fold;
   for (const auto& entry : arguments)
-    if (entry.second) values.push_back((entry.second->*ask)());
-  ssaopt::list<KvCCfgValue*> pointers;
-  for (KvCCfgValue& value : values) pointers.push_back(&value);
-  return combine(pointers);
+    if (entry.second) fold.add((entry.second->*ask)());
+  return fold.result();
 }
 
 }  // namespace
@@ -124,15 +121,15 @@ KvCCfgExpression* KvCCfgParamStatement::getArgument(KvCCfgProcedureCall* pCall) 
 }
 
 KvCCfgValue KvCCfgParamStatement::evaluate() const {
-  return combineArguments(m_Arguments, &KvCCfgExpression::evaluate, intersect);
+  return combineArguments<ssaopt::ValueMeet>(m_Arguments, &KvCCfgExpression::evaluate);
 }
 
 KvCCfgValue KvCCfgParamStatement::getMinimum() const {
-  return combineArguments(m_Arguments, &KvCCfgExpression::getMinimum, determineMinimum);
+  return combineArguments<ssaopt::ValueMinimum>(m_Arguments, &KvCCfgExpression::getMinimum);
 }
 
 KvCCfgValue KvCCfgParamStatement::getMaximum() const {
-  return combineArguments(m_Arguments, &KvCCfgExpression::getMaximum, determineMaximum);
+  return combineArguments<ssaopt::ValueMaximum>(m_Arguments, &KvCCfgExpression::getMaximum);
 }
 
 ssaopt::set<KvCCfgVariable*> KvCCfgValueReturnStatement::getUsedVariables() const {

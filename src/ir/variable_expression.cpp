@@ -2,7 +2,7 @@
 #include "ssaopt/ir/variable_expression.h"
 
 #include "ssaopt/ir/variable.h"
-#include "ssaopt/values/arithmetic.h"
+#include "ssaopt/values/merge.h"
 
 void KvCCfgVariableExpression::replaceVariable(KvCCfgVariable* pOld, KvCCfgVariable* pNew) {
   m_Variables.erase(pOld);
@@ -16,13 +16,14 @@ KvCCfgValue KvCCfgVariableExpression::evaluate() const {
   return pValue ? *pValue : KvCCfgValue();
 }
 
-KvCCfgValue KvCCfgVariableExpression::getMinimum() const { return determineMinimum(memberValues()); }
+KvCCfgValue KvCCfgVariableExpression::getMinimum() const { return foldMemberValues<ssaopt::ValueMinimum>(); }
 
-KvCCfgValue KvCCfgVariableExpression::getMaximum() const { return determineMaximum(memberValues()); }
+KvCCfgValue KvCCfgVariableExpression::getMaximum() const { return foldMemberValues<ssaopt::ValueMaximum>(); }
 
-// The list functions only read the values, so the members' own values serve without copies.
-ssaopt::list<KvCCfgValue*> KvCCfgVariableExpression::memberValues() const {
-  ssaopt::list<KvCCfgValue*> values;
-  for (const KvCCfgVariable* pVariable : m_Variables) values.push_back(pVariable->getValue());
-  return values;
+// The members' values in ascending member order, as the list merges would take them.
+template <class Fold>
+KvCCfgValue KvCCfgVariableExpression::foldMemberValues() const {
+  Fold fold;
+  for (const KvCCfgVariable* pVariable : m_Variables) fold.add(*pVariable->getValue());
+  return fold.result();
 }

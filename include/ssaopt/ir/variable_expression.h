@@ -33,7 +33,8 @@ public:
   void actOnComparisonOutsideBoolRange() override {}
 
 private:
-  ssaopt::list<KvCCfgValue*> memberValues() const;
+  template <class Fold>
+  KvCCfgValue foldMemberValues() const;
 
   ssaopt::set<KvCCfgVariable*> m_Variables;
 };
