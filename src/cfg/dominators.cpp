@@ -289,7 +289,7 @@ void KvCControlFlowGraph::computeDominanceFrontiers(array<KvCDominatorTree*>& tr
   for (KvCDominatorTree* pTree : trees) {
     if (!pTree) continue;
     for (node t : pTree->nodes())
-      if (KvCCfgNodeInfo* pInf = inf(pTree->inf(t))) pInf->getDF()->clear();
+      if (KvCCfgNodeInfo* pInf = inf(pTree->inf(t))) pInf->clearDF();
     if (!pTree->getRoot()) continue;
     node_array<int> dist(*pTree, -1);
     ssaopt::list<node> order = BFS(*pTree, pTree->getRoot(), dist);
@@ -301,13 +301,13 @@ void KvCControlFlowGraph::fillFrontier(const KvCDominatorTree& tree, node t) {
   node x = tree.inf(t);
   KvCCfgNodeInfo* pInf = inf(x);
   if (!pInf) return;
-  ssaopt::set<node>& frontier = *pInf->getDF();
   for (edge e : out(x))
-    if (idomOf(target(e)) != x) frontier.insert(target(e));
+    if (idomOf(target(e)) != x) pInf->getDF()->insert(target(e));
   for (edge treeEdge : tree.out(t)) {
     KvCCfgNodeInfo* pChild = inf(tree.inf(tree.target(treeEdge)));
-    if (!pChild) continue;
-    for (node y : *pChild->getDF())
-      if (idomOf(y) != x) frontier.insert(y);
+    const ssaopt::set<node>* pChildFrontier = pChild ? pChild->frontierIfAny() : nullptr;
+    if (!pChildFrontier) continue;
+    for (node y : *pChildFrontier)
+      if (idomOf(y) != x) pInf->getDF()->insert(y);
   }
 }

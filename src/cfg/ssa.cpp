@@ -103,17 +103,19 @@ void KvCControlFlowGraph::placePhiFunction() {
   DefinitionSites sites;
   list<KvCCfgVariable*> variables = getDefinedVariables(sites);
   int iteration = 0;
-  list<node> worklist;
+  ssaopt::queue<node> worklist;
   for (KvCCfgVariable* pVariable : variables) {
     ++iteration;
     for (node x : sites[pVariable]) {
       work[x] = iteration;
       worklist.push_back(x);
     }
-    for (; !worklist.empty(); worklist.pop_front()) {
-      KvCCfgNodeInfo* pInf = inf(worklist.front());
+    while (!worklist.empty()) {
+      KvCCfgNodeInfo* pInf = inf(worklist.pop_front());
       if (!pInf) continue;
-      for (node y : *pInf->getDF()) {
+      const ssaopt::set<node>* pFrontier = pInf->frontierIfAny();
+      if (!pFrontier) continue;
+      for (node y : *pFrontier) {
         if (hasAlready[y] >= iteration) continue;
         if (KvCBasicBlock* pBlock = blockForPhiFunctions(y))
           pBlock->append(new KvCPhiFunction(pVariable, indeg(y)));
@@ -146,10 +148,10 @@ KvCBasicBlock* KvCControlFlowGraph::turnExitIntoBlock(node y) {
   newPlainEdge(y, exit);
   KvCBasicBlock* pBlock = new KvCBasicBlock();
   pBlock->setIdom(pExit->getIdom());
-  *pBlock->getDF() = *pExit->getDF();
+  if (const ssaopt::set<node>* pFrontier = pExit->frontierIfAny()) *pBlock->getDF() = *pFrontier;
   assign(y, pBlock);
   pExit->setIdom(y);
-  pExit->getDF()->clear();
+  pExit->clearDF();
   KvCCfgProcedure* pProcedure = pExit->getProcedure();
   KV_CONSISTENCY_CHECK(pProcedure, "pProcedure", kClassName, kLineExitWithoutProcedure);
   pBlock->setProcedure(pProcedure);

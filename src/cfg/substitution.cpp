@@ -113,7 +113,8 @@ private:
 
   void note(KvCCfgVariable& variable, node v) {
     m_Definitions.insert(variable, v);
-    for (KvCCfgVariable* pAlias : variable.virtualAliases()) m_AliasOwners.insert(*pAlias, &variable);
+    if (const ssaopt::set<KvCCfgVariable*>* pAliases = variable.virtualAliases())
+      for (KvCCfgVariable* pAlias : *pAliases) m_AliasOwners.insert(*pAlias, &variable);
   }
 
   // `variable` has no use left: its definitions, and those of the variables it is a virtual alias of,

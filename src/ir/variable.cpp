@@ -86,7 +86,8 @@ bool KvCCfgVariable::isScaled() const {
 }
 
 KvCCfgVariable* KvCCfgVariable::topSSAReplacement() const {
-  return m_SSAReplacements.empty() ? nullptr : m_SSAReplacements.top();
+  const ssaopt::stack<KvCCfgVariable*>* pStack = m_SSAReplacements.find();
+  return pStack && !pStack->empty() ? pStack->top() : nullptr;
 }
 
 void KvCCfgVariable::markAsArray() {
@@ -112,13 +113,15 @@ int KvCCfgVariable::delUse(ssaopt::node v) {
 
 ssaopt::set<ssaopt::node> KvCCfgVariable::getAllUses() const {
   ssaopt::set<ssaopt::node> uses = m_Uses;
-  for (const KvCCfgVariable* pAlias : m_VirtualAliases) ssaopt::insertAll(uses, pAlias->m_Uses);
+  if (const ssaopt::set<KvCCfgVariable*>* pAliases = m_VirtualAliases.find())
+    for (const KvCCfgVariable* pAlias : *pAliases) ssaopt::insertAll(uses, pAlias->m_Uses);
   return uses;
 }
 
 int KvCCfgVariable::countAllUses() const {
   int count = countUses();
-  for (const KvCCfgVariable* pAlias : m_VirtualAliases) count += pAlias->countUses();
+  if (const ssaopt::set<KvCCfgVariable*>* pAliases = m_VirtualAliases.find())
+    for (const KvCCfgVariable* pAlias : *pAliases) count += pAlias->countUses();
   return count;
 }
 

@@ -73,6 +73,51 @@ private:
   array<T> m_Items;
 };
 
+// An object that its owner makes on first use: until then it costs one pointer. Copies copy the
+// object (or its absence); memory follows the module allocation rule.
+template <class T>
+class on_demand {
+public:
+  on_demand() = default;
+  on_demand(const on_demand& other) : m_pObject(other.m_pObject ? make(*other.m_pObject) : nullptr) {}
+  on_demand& operator=(const on_demand& other) {
+    if (this != &other) {
+      T* pCopy = other.m_pObject ? make(*other.m_pObject) : nullptr;
+      reset();
+      m_pObject = pCopy;
+    }
+    return *this;
+  }
+  ~on_demand() { reset(); }
+
+  // The object, made now if it was not.
+  T& get() {
+    if (!m_pObject) m_pObject = make(T());
+    return *m_pObject;
+  }
+  // The object, or null when it was never made.
+  T* find() const { return m_pObject; }
+  void reset() {
+    if (!m_pObject) return;
+    m_pObject->~T();
+    ModuleAllocator<T>().deallocate(m_pObject, 1);
+    m_pObject = nullptr;
+  }
+
+private:
+  static T* make(const T& from) {
+    T* pObject = ModuleAllocator<T>().allocate(1);
+    try {
+      return new (pObject) T(from);
+    } catch (...) {
+      ModuleAllocator<T>().deallocate(pObject, 1);
+      throw;
+    }
+  }
+
+  T* m_pObject = nullptr;
+};
+
 // First-in first-out queue on a growable array: no allocation per element, unlike a list. The slots
 // before the front are given up once they are the larger part, so a queue that never empties keeps
 // at most twice what it holds (and each element is moved at most once on average).

@@ -31,13 +31,17 @@ public:
   void setIdom(ssaopt::node idom) { m_Idom = idom; }
   KvCCfgProcedure* getProcedure() const { return m_pProcedure; }
   void setProcedure(KvCCfgProcedure* pProcedure) { m_pProcedure = pProcedure; }
-  // The dominance frontier, for the dominator computation to fill and read.
-  ssaopt::set<ssaopt::node>* getDF() { return &m_DF; }
+  // The dominance frontier, for the dominator computation to fill and read. Most nodes have an empty
+  // one, which costs nothing until getDF() is first called.
+  ssaopt::set<ssaopt::node>* getDF() { return &m_DF.get(); }
+  // The frontier without making one: null while it was never asked for or has been cleared.
+  const ssaopt::set<ssaopt::node>* frontierIfAny() const { return m_DF.find(); }
+  void clearDF() { m_DF.reset(); }
 
 private:
   ssaopt::node m_Idom;
   KvCCfgProcedure* m_pProcedure = nullptr;
-  ssaopt::set<ssaopt::node> m_DF;
+  ssaopt::on_demand<ssaopt::set<ssaopt::node>> m_DF;
 };
 
 // Phi functions, then statements in execution order, then optionally a two-way branch condition.

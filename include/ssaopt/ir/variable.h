@@ -64,16 +64,17 @@ public:
   bool isScaled() const;
 
   // The SSA versions that stand for this variable while renaming walks the dominator tree.
-  void pushSSAReplacement(KvCCfgVariable* pReplacement) { m_SSAReplacements.push(pReplacement); }
+  void pushSSAReplacement(KvCCfgVariable* pReplacement) { m_SSAReplacements.get().push(pReplacement); }
   // The stack must not be empty.
-  KvCCfgVariable* popSSAReplacement() { return m_SSAReplacements.pop(); }
+  KvCCfgVariable* popSSAReplacement() { return m_SSAReplacements.get().pop(); }
   // Null when the stack is empty.
   KvCCfgVariable* topSSAReplacement() const;
 
   KvCCfgVariable* getNonVirtualAlias() const { return m_pNonVirtualAlias; }
   void setNonVirtualAlias(KvCCfgVariable* pAlias) { m_pNonVirtualAlias = pAlias; }
-  void appendVirtualAlias(KvCCfgVariable* pAlias) { m_VirtualAliases.insert(pAlias); }
-  const ssaopt::set<KvCCfgVariable*>& virtualAliases() const { return m_VirtualAliases; }
+  void appendVirtualAlias(KvCCfgVariable* pAlias) { m_VirtualAliases.get().insert(pAlias); }
+  // The variables appended as virtual aliases; null when there is none.
+  const ssaopt::set<KvCCfgVariable*>* virtualAliases() const { return m_VirtualAliases.find(); }
 
   // Array and volatile variables are never constant: marking one drops its current value.
   bool isArray() const { return m_IsArray; }
@@ -108,14 +109,16 @@ private:
   static std::uint32_t s_GlobIndexCnt;
 
   std::uint32_t m_Index;
-  ssaopt::stack<KvCCfgVariable*> m_SSAReplacements;
+  // Only original variables use the replacement stack, and few variables have virtual aliases: both
+  // are made when first used.
+  ssaopt::on_demand<ssaopt::stack<KvCCfgVariable*>> m_SSAReplacements;
   KvCCfgValue* m_pValue;
   ssaopt::set<ssaopt::node> m_Uses;
   bool m_IsArray = false;
   bool m_IsErasable = false;
   bool m_IsVolatile = false;
   KvCCfgVariable* m_pNonVirtualAlias;
-  ssaopt::set<KvCCfgVariable*> m_VirtualAliases;
+  ssaopt::on_demand<ssaopt::set<KvCCfgVariable*>> m_VirtualAliases;
 };
 
 class KvCSSAVariable : public KvCCfgVariable {
