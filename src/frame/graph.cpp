@@ -2,8 +2,9 @@
 
 namespace ssaopt {
 
-using detail::EdgeRep;
-using detail::NodeRep;
+using detail::EdgeRecord;
+using detail::kNoRecord;
+using detail::NodeRecord;
 
 graph::graph(const graph& other) : graph() { copyShapeFrom(other); }
 
@@ -24,74 +25,72 @@ void graph::copyShapeFrom(const graph& other) {
 }
 
 node graph::new_node() {
-  NodeRep* v = new NodeRep;
-  m_PoolHold.holdLatest();
-  v->index = m_NextNodeIndex++;
-  v->prev = m_pLastNode;
-  (m_pLastNode ? m_pLastNode->next : m_pFirstNode) = v;
-  m_pLastNode = v;
+  std::uint32_t v = m_NextNodeIndex;
+  if (m_Nodes.reserve(v)) m_PoolHold.holdLatest();
+  ++m_NextNodeIndex;
+  NodeRecord& record = m_Nodes[v];
+  record = NodeRecord();
+  record.prev = m_LastNode;
+  (m_LastNode != kNoRecord ? m_Nodes[m_LastNode].next : m_FirstNode) = v;
+  m_LastNode = v;
   ++m_NodeCount;
-  return makeHandle(v);
+  return handleOf<node>(v);
 }
 
 edge graph::new_edge(node v, node w) {
-  EdgeRep* e = new EdgeRep;
-  m_PoolHold.holdLatest();
-  e->index = m_NextEdgeIndex++;
-  e->prev = m_pLastEdge;
-  (m_pLastEdge ? m_pLastEdge->next : m_pFirstEdge) = e;
-  m_pLastEdge = e;
+  std::uint32_t e = m_NextEdgeIndex;
+  if (m_Edges.reserve(e)) m_PoolHold.holdLatest();
+  ++m_NextEdgeIndex;
+  EdgeRecord& record = m_Edges[e];
+  record = EdgeRecord();
+  record.prev = m_LastEdge;
+  (m_LastEdge != kNoRecord ? m_Edges[m_LastEdge].next : m_FirstEdge) = e;
+  m_LastEdge = e;
   ++m_EdgeCount;
-  linkOut(e, v.m_pRep);
-  linkIn(e, w.m_pRep);
-  return makeHandle(e);
+  linkOut(e, v.index());
+  linkIn(e, w.index());
+  return handleOf<edge>(e);
 }
 
 void graph::del_edge(edge handle) {
-  EdgeRep* e = handle.m_pRep;
+  std::uint32_t e = handle.index();
   unlinkOut(e);
   unlinkIn(e);
-  (e->prev ? e->prev->next : m_pFirstEdge) = e->next;
-  (e->next ? e->next->prev : m_pLastEdge) = e->prev;
+  EdgeRecord& record = m_Edges[e];
+  (record.prev != kNoRecord ? m_Edges[record.prev].next : m_FirstEdge) = record.next;
+  (record.next != kNoRecord ? m_Edges[record.next].prev : m_LastEdge) = record.prev;
+  record = EdgeRecord();
   --m_EdgeCount;
-  delete e;
 }
 
 void graph::del_node(node handle) {
-  NodeRep* v = handle.m_pRep;
-  while (v->firstOut) del_edge(makeHandle(v->firstOut));
-  while (v->firstIn) del_edge(makeHandle(v->firstIn));
-  (v->prev ? v->prev->next : m_pFirstNode) = v->next;
-  (v->next ? v->next->prev : m_pLastNode) = v->prev;
+  std::uint32_t v = handle.index();
+  while (m_Nodes[v].firstOut != kNoRecord) del_edge(handleOf<edge>(m_Nodes[v].firstOut));
+  while (m_Nodes[v].firstIn != kNoRecord) del_edge(handleOf<edge>(m_Nodes[v].firstIn));
+  NodeRecord& record = m_Nodes[v];
+  (record.prev != kNoRecord ? m_Nodes[record.prev].next : m_FirstNode) = record.next;
+  (record.next != kNoRecord ? m_Nodes[record.next].prev : m_LastNode) = record.prev;
+  record = NodeRecord();
   --m_NodeCount;
-  delete v;
 }
 
 void graph::move_edge(edge handle, node v, node w) {
-  EdgeRep* e = handle.m_pRep;
-  if (e->source != v.m_pRep) {
+  std::uint32_t e = handle.index();
+  if (m_Edges[e].source != v.index()) {
     unlinkOut(e);
-    linkOut(e, v.m_pRep);
+    linkOut(e, v.index());
   }
-  if (e->target != w.m_pRep) {
+  if (m_Edges[e].target != w.index()) {
     unlinkIn(e);
-    linkIn(e, w.m_pRep);
+    linkIn(e, w.index());
   }
 }
 
 void graph::clear() {
-  for (EdgeRep* e = m_pFirstEdge; e;) {
-    EdgeRep* next = e->next;
-    delete e;
-    e = next;
-  }
-  for (NodeRep* v = m_pFirstNode; v;) {
-    NodeRep* next = v->next;
-    delete v;
-    v = next;
-  }
-  m_pFirstNode = m_pLastNode = nullptr;
-  m_pFirstEdge = m_pLastEdge = nullptr;
+  m_Nodes.release(m_NextNodeIndex);
+  m_Edges.release(m_NextEdgeIndex);
+  m_FirstNode = m_LastNode = kNoRecord;
+  m_FirstEdge = m_LastEdge = kNoRecord;
   m_NodeCount = m_EdgeCount = 0;
 }
 
@@ -121,40 +120,46 @@ list<edge> graph::in_edges(node v) const {
 
 int graph::in_position(edge handle) const {
   int position = 0;
-  for (EdgeRep* e = handle.m_pRep->prevIn; e; e = e->prevIn) ++position;
+  for (std::uint32_t e = m_Edges[handle.index()].prevIn; e != kNoRecord; e = m_Edges[e].prevIn) ++position;
   return position;
 }
 
-void graph::linkOut(EdgeRep* e, NodeRep* v) {
-  e->source = v;
-  e->nextOut = nullptr;
-  e->prevOut = v->lastOut;
-  (v->lastOut ? v->lastOut->nextOut : v->firstOut) = e;
-  v->lastOut = e;
-  ++v->outdeg;
+void graph::linkOut(std::uint32_t e, std::uint32_t v) {
+  EdgeRecord& record = m_Edges[e];
+  NodeRecord& source = m_Nodes[v];
+  record.source = v;
+  record.nextOut = kNoRecord;
+  record.prevOut = source.lastOut;
+  (source.lastOut != kNoRecord ? m_Edges[source.lastOut].nextOut : source.firstOut) = e;
+  source.lastOut = e;
+  ++source.outdeg;
 }
 
-void graph::unlinkOut(EdgeRep* e) {
-  NodeRep* v = e->source;
-  (e->prevOut ? e->prevOut->nextOut : v->firstOut) = e->nextOut;
-  (e->nextOut ? e->nextOut->prevOut : v->lastOut) = e->prevOut;
-  --v->outdeg;
+void graph::unlinkOut(std::uint32_t e) {
+  EdgeRecord& record = m_Edges[e];
+  NodeRecord& source = m_Nodes[record.source];
+  (record.prevOut != kNoRecord ? m_Edges[record.prevOut].nextOut : source.firstOut) = record.nextOut;
+  (record.nextOut != kNoRecord ? m_Edges[record.nextOut].prevOut : source.lastOut) = record.prevOut;
+  --source.outdeg;
 }
 
-void graph::linkIn(EdgeRep* e, NodeRep* w) {
-  e->target = w;
-  e->nextIn = nullptr;
-  e->prevIn = w->lastIn;
-  (w->lastIn ? w->lastIn->nextIn : w->firstIn) = e;
-  w->lastIn = e;
-  ++w->indeg;
+void graph::linkIn(std::uint32_t e, std::uint32_t w) {
+  EdgeRecord& record = m_Edges[e];
+  NodeRecord& target = m_Nodes[w];
+  record.target = w;
+  record.nextIn = kNoRecord;
+  record.prevIn = target.lastIn;
+  (target.lastIn != kNoRecord ? m_Edges[target.lastIn].nextIn : target.firstIn) = e;
+  target.lastIn = e;
+  ++target.indeg;
 }
 
-void graph::unlinkIn(EdgeRep* e) {
-  NodeRep* w = e->target;
-  (e->prevIn ? e->prevIn->nextIn : w->firstIn) = e->nextIn;
-  (e->nextIn ? e->nextIn->prevIn : w->lastIn) = e->prevIn;
-  --w->indeg;
+void graph::unlinkIn(std::uint32_t e) {
+  EdgeRecord& record = m_Edges[e];
+  NodeRecord& target = m_Nodes[record.target];
+  (record.prevIn != kNoRecord ? m_Edges[record.prevIn].nextIn : target.firstIn) = record.nextIn;
+  (record.nextIn != kNoRecord ? m_Edges[record.nextIn].prevIn : target.lastIn) = record.prevIn;
+  --target.indeg;
 }
 
 }  // namespace ssaopt

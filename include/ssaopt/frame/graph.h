@@ -8,8 +8,13 @@
 // - move_edge(e, v, w) unlinks an end that changes and appends it at the end of the new node's list,
 //   while an end that stays keeps its position (so the in-edge order of a target, which orders its
 //   phi operands, survives moving the edge to a new source);
-// - a handle carries its node's creation number, so ordering, hashing and comparing handles never
-//   read the node itself: sets of nodes may outlive the nodes they hold.
+// - a handle is its node's creation number and nothing else, so ordering, hashing and comparing
+//   handles never read the node itself: sets of nodes may outlive the nodes they hold.
+//
+// Nodes and edges are records of 32-bit creation numbers in arrays of chunks that never move, indexed
+// by creation number: a node costs 32 bytes and an edge 32, where records linked by pointers cost 64
+// and 72, and a handle costs 4 bytes. A deleted node's or edge's record stays unused, since creation
+// numbers are never given again (clear() gives back the records of all).
 #pragma once
 
 #include <cstdint>
@@ -23,11 +28,6 @@
 
 namespace ssaopt {
 
-namespace detail {
-struct NodeRep;
-struct EdgeRep;
-}  // namespace detail
-
 // The null handle, comparable with and convertible to node and edge.
 struct nil_t {
   explicit constexpr nil_t(int) {}
@@ -36,129 +36,209 @@ inline constexpr nil_t nil{0};
 
 class graph;
 
+namespace detail {
+
+// A handle: creation number + 1, so that 0 is nil. A nil handle's index() is 0, as before any node.
+template <class Tag>
+class Handle {
+public:
+  Handle() = default;
+  Handle(nil_t) {}  // NOLINT: implicit, so that `v = nil` reads as in the algorithms
+
+  std::uint32_t index() const { return m_Id == 0 ? 0 : m_Id - 1; }
+  bool isNil() const { return m_Id == 0; }
+  explicit operator bool() const { return m_Id != 0; }
+
+  friend bool operator==(Handle a, Handle b) { return a.m_Id == b.m_Id; }
+  friend bool operator!=(Handle a, Handle b) { return a.m_Id != b.m_Id; }
+  friend bool operator==(Handle a, nil_t) { return a.m_Id == 0; }
+  friend bool operator!=(Handle a, nil_t) { return a.m_Id != 0; }
+  friend bool operator<(Handle a, Handle b) { return a.m_Id < b.m_Id; }
+
+private:
+  friend class ssaopt::graph;
+  static Handle ofIndex(std::uint32_t index) { return Handle(index + 1); }
+  explicit Handle(std::uint32_t id) : m_Id(id) {}
+
+  std::uint32_t m_Id = 0;
+};
+
+struct NodeTag;
+struct EdgeTag;
+
+// Creation number of no node or edge: the end of a list.
+inline constexpr std::uint32_t kNoRecord = 0xFFFFFFFFu;
+
+struct NodeRecord {
+  std::uint32_t prev = kNoRecord;  // in the graph's node list
+  std::uint32_t next = kNoRecord;
+  std::uint32_t firstOut = kNoRecord;
+  std::uint32_t lastOut = kNoRecord;
+  std::uint32_t firstIn = kNoRecord;
+  std::uint32_t lastIn = kNoRecord;
+  std::uint32_t outdeg = 0;
+  std::uint32_t indeg = 0;
+};
+
+struct EdgeRecord {
+  std::uint32_t source = kNoRecord;
+  std::uint32_t target = kNoRecord;
+  std::uint32_t prev = kNoRecord;  // in the graph's edge list
+  std::uint32_t next = kNoRecord;
+  std::uint32_t prevOut = kNoRecord;  // in the source's out-edge list
+  std::uint32_t nextOut = kNoRecord;
+  std::uint32_t prevIn = kNoRecord;  // in the target's in-edge list
+  std::uint32_t nextIn = kNoRecord;
+};
+
+// Elements by number in chunks that never move: chunk 0 holds 16 elements and every further chunk
+// as many as all before it, up to kLargest per chunk. So a small array (of a dominator tree, a call
+// graph) takes little memory, a large one wastes less than one chunk, and growing copies nothing.
+// Elements exist up to size() only.
+template <class T>
+class ChunkedArray {
+public:
+  ChunkedArray() = default;
+  ChunkedArray(const ChunkedArray& other) { copyFrom(other); }
+  ChunkedArray& operator=(const ChunkedArray& other) {
+    if (this != &other) {
+      clear();
+      copyFrom(other);
+    }
+    return *this;
+  }
+  ~ChunkedArray() { clear(); }
+
+  std::size_t size() const { return m_Size; }
+  T& operator[](std::size_t i) {
+    std::size_t chunk = chunkOf(i);
+    return m_Chunks[chunk][i - startOf(chunk)];
+  }
+  const T& operator[](std::size_t i) const { return const_cast<ChunkedArray&>(*this)[i]; }
+
+  // Adds elements equal to `value` up to `count`; never shrinks. True when a chunk was allocated.
+  bool grow(std::size_t count, const T& value) {
+    bool allocated = false;
+    for (; m_Size < count; ++m_Size) {
+      std::size_t chunk = chunkOf(m_Size);
+      if (chunk == m_Chunks.size()) {
+        m_Chunks.push_back(ModuleAllocator<T>().allocate(sizeOf(chunk)));
+        allocated = true;
+      }
+      new (&m_Chunks[chunk][m_Size - startOf(chunk)]) T(value);
+    }
+    return allocated;
+  }
+  void clear() {
+    for (std::size_t i = 0; i < m_Size; ++i) (*this)[i].~T();
+    for (std::size_t chunk = 0; chunk < m_Chunks.size(); ++chunk)
+      ModuleAllocator<T>().deallocate(m_Chunks[chunk], sizeOf(chunk));
+    m_Chunks.clear();
+    m_Size = 0;
+  }
+
+private:
+  static constexpr unsigned kFirstShift = 4;
+  static constexpr unsigned kLargestShift = 12;
+  static constexpr std::size_t kLargest = std::size_t(1) << kLargestShift;
+  // The chunks that double: 0 to kDoubling - 1, together holding kLargest elements.
+  static constexpr std::size_t kDoubling = kLargestShift - kFirstShift + 1;
+
+  static std::size_t chunkOf(std::size_t i) {
+    if (i >= kLargest) return (i >> kLargestShift) + kDoubling - 1;
+    if ((i >> kFirstShift) == 0) return 0;
+    return 32 - static_cast<std::size_t>(__builtin_clz(static_cast<unsigned>(i >> kFirstShift)));
+  }
+  static std::size_t startOf(std::size_t chunk) {
+    if (chunk >= kDoubling) return (chunk - kDoubling + 1) << kLargestShift;
+    return chunk == 0 ? 0 : (std::size_t(1) << kFirstShift) << (chunk - 1);
+  }
+  static std::size_t sizeOf(std::size_t chunk) {
+    if (chunk >= kDoubling) return kLargest;
+    return chunk == 0 ? std::size_t(1) << kFirstShift : (std::size_t(1) << kFirstShift) << (chunk - 1);
+  }
+
+  void copyFrom(const ChunkedArray& other) {
+    for (std::size_t i = 0; i < other.m_Size; ++i) grow(i + 1, other[i]);
+  }
+
+  array<T*> m_Chunks;
+  std::size_t m_Size = 0;
+};
+
+// Records by creation number. Numbers below the base were cleared.
+template <class Record>
+class RecordStore {
+public:
+  Record& operator[](std::uint32_t number) { return m_Records[number - m_Base]; }
+  const Record& operator[](std::uint32_t number) const { return m_Records[number - m_Base]; }
+  // Makes room for record `number`, the next one to be created; true when that took new memory.
+  bool reserve(std::uint32_t number) { return m_Records.grow(number - m_Base + 1, Record()); }
+  // Gives back every record; the next one is number `nextBase`.
+  void release(std::uint32_t nextBase) {
+    m_Records.clear();
+    m_Base = nextBase;
+  }
+
+private:
+  ChunkedArray<Record> m_Records;
+  std::uint32_t m_Base = 0;
+};
+
+}  // namespace detail
+
 // Handle of a node. Its index is the node's creation number in its graph, unique for the graph's
 // lifetime (never reused), so sets of nodes iterate in creation order.
-class node {
-public:
-  node() = default;
-  node(nil_t) {}  // NOLINT: implicit, so that `v = nil` reads as in the algorithms
-
-  std::uint32_t index() const { return m_Index; }
-  bool isNil() const { return m_pRep == nullptr; }
-  explicit operator bool() const { return m_pRep != nullptr; }
-
-  friend bool operator==(node a, node b) { return a.m_pRep == b.m_pRep && a.m_Index == b.m_Index; }
-  friend bool operator!=(node a, node b) { return !(a == b); }
-  friend bool operator==(node a, nil_t) { return a.m_pRep == nullptr; }
-  friend bool operator!=(node a, nil_t) { return a.m_pRep != nullptr; }
-  friend bool operator<(node a, node b) {
-    if (a.m_Index != b.m_Index) return a.m_Index < b.m_Index;
-    return std::less<const detail::NodeRep*>()(a.m_pRep, b.m_pRep);
-  }
-
-  // The handle of a representation (nil for null); for the graph layer itself.
-  static node fromRep(detail::NodeRep* rep);
-
-private:
-  friend class graph;
-  node(detail::NodeRep* rep, std::uint32_t index) : m_pRep(rep), m_Index(index) {}
-
-  detail::NodeRep* m_pRep = nullptr;
-  std::uint32_t m_Index = 0;
-};
-
+using node = detail::Handle<detail::NodeTag>;
 // Handle of an edge; its index is the edge's creation number in its graph.
-class edge {
-public:
-  edge() = default;
-  edge(nil_t) {}  // NOLINT: implicit, as for node
-
-  std::uint32_t index() const { return m_Index; }
-  bool isNil() const { return m_pRep == nullptr; }
-  explicit operator bool() const { return m_pRep != nullptr; }
-
-  friend bool operator==(edge a, edge b) { return a.m_pRep == b.m_pRep && a.m_Index == b.m_Index; }
-  friend bool operator!=(edge a, edge b) { return !(a == b); }
-  friend bool operator==(edge a, nil_t) { return a.m_pRep == nullptr; }
-  friend bool operator!=(edge a, nil_t) { return a.m_pRep != nullptr; }
-  friend bool operator<(edge a, edge b) {
-    if (a.m_Index != b.m_Index) return a.m_Index < b.m_Index;
-    return std::less<const detail::EdgeRep*>()(a.m_pRep, b.m_pRep);
-  }
-
-  // The handle of a representation (nil for null); for the graph layer itself.
-  static edge fromRep(detail::EdgeRep* rep);
-
-private:
-  friend class graph;
-  edge(detail::EdgeRep* rep, std::uint32_t index) : m_pRep(rep), m_Index(index) {}
-
-  detail::EdgeRep* m_pRep = nullptr;
-  std::uint32_t m_Index = 0;
-};
+using edge = detail::Handle<detail::EdgeTag>;
 
 namespace detail {
 
-struct NodeRep {
-  SSAOPT_MODULE_ALLOCATED
-  std::uint32_t index;
-  NodeRep* prev = nullptr;  // in the graph's node list
-  NodeRep* next = nullptr;
-  EdgeRep* firstOut = nullptr;
-  EdgeRep* lastOut = nullptr;
-  EdgeRep* firstIn = nullptr;
-  EdgeRep* lastIn = nullptr;
-  int outdeg = 0;
-  int indeg = 0;
-};
-
-struct EdgeRep {
-  SSAOPT_MODULE_ALLOCATED
-  std::uint32_t index;
-  NodeRep* source = nullptr;
-  NodeRep* target = nullptr;
-  EdgeRep* prev = nullptr;  // in the graph's edge list
-  EdgeRep* next = nullptr;
-  EdgeRep* prevOut = nullptr;  // in the source's out-edge list
-  EdgeRep* nextOut = nullptr;
-  EdgeRep* prevIn = nullptr;  // in the target's in-edge list
-  EdgeRep* nextIn = nullptr;
-};
-
-// Forward iteration over an intrusive list that fetches the successor before yielding an element, so
-// the loop body may delete the element it is given (but no other element of the same list).
-template <class Handle, class Rep, Rep* Rep::*Next>
+// Forward iteration over an intrusive list of records that fetches the successor before yielding an
+// element, so the loop body may delete the element it is given (but no other element of the same
+// list).
+template <class H, class Record, std::uint32_t Record::*Next>
 class LinkRange {
 public:
   class iterator {
   public:
     using iterator_category = std::forward_iterator_tag;
-    using value_type = Handle;
+    using value_type = H;
     using difference_type = std::ptrdiff_t;
-    using pointer = const Handle*;
-    using reference = Handle;
+    using pointer = const H*;
+    using reference = H;
 
-    explicit iterator(Rep* rep) : m_pRep(rep), m_pNext(rep ? rep->*Next : nullptr) {}
-    Handle operator*() const { return Handle::fromRep(m_pRep); }
+    iterator(const RecordStore<Record>* pStore, std::uint32_t number)
+        : m_pStore(pStore), m_Number(number), m_Next(nextOf(number)) {}
+    H operator*() const { return graphHandle(m_Number); }
     iterator& operator++() {
-      m_pRep = m_pNext;
-      m_pNext = m_pRep ? m_pRep->*Next : nullptr;
+      m_Number = m_Next;
+      m_Next = nextOf(m_Number);
       return *this;
     }
-    friend bool operator==(const iterator& a, const iterator& b) { return a.m_pRep == b.m_pRep; }
-    friend bool operator!=(const iterator& a, const iterator& b) { return a.m_pRep != b.m_pRep; }
+    friend bool operator==(const iterator& a, const iterator& b) { return a.m_Number == b.m_Number; }
+    friend bool operator!=(const iterator& a, const iterator& b) { return a.m_Number != b.m_Number; }
 
   private:
-    Rep* m_pRep;
-    Rep* m_pNext;
+    std::uint32_t nextOf(std::uint32_t number) const {
+      return number == kNoRecord ? kNoRecord : (*m_pStore)[number].*Next;
+    }
+
+    const RecordStore<Record>* m_pStore;
+    std::uint32_t m_Number;
+    std::uint32_t m_Next;
   };
 
-  explicit LinkRange(Rep* first) : m_pFirst(first) {}
-  iterator begin() const { return iterator(m_pFirst); }
-  iterator end() const { return iterator(nullptr); }
+  LinkRange(const RecordStore<Record>* pStore, std::uint32_t first) : m_pStore(pStore), m_First(first) {}
+  iterator begin() const { return iterator(m_pStore, m_First); }
+  iterator end() const { return iterator(m_pStore, kNoRecord); }
 
 private:
-  Rep* m_pFirst;
+  static H graphHandle(std::uint32_t number);
+
+  const RecordStore<Record>* m_pStore;
+  std::uint32_t m_First;
 };
 
 }  // namespace detail
@@ -169,10 +249,10 @@ class graph {
 public:
   SSAOPT_MODULE_ALLOCATED
 
-  using NodeRange = detail::LinkRange<node, detail::NodeRep, &detail::NodeRep::next>;
-  using EdgeRange = detail::LinkRange<edge, detail::EdgeRep, &detail::EdgeRep::next>;
-  using OutEdgeRange = detail::LinkRange<edge, detail::EdgeRep, &detail::EdgeRep::nextOut>;
-  using InEdgeRange = detail::LinkRange<edge, detail::EdgeRep, &detail::EdgeRep::nextIn>;
+  using NodeRange = detail::LinkRange<node, detail::NodeRecord, &detail::NodeRecord::next>;
+  using EdgeRange = detail::LinkRange<edge, detail::EdgeRecord, &detail::EdgeRecord::next>;
+  using OutEdgeRange = detail::LinkRange<edge, detail::EdgeRecord, &detail::EdgeRecord::nextOut>;
+  using InEdgeRange = detail::LinkRange<edge, detail::EdgeRecord, &detail::EdgeRecord::nextIn>;
 
   graph() = default;
   graph(const graph& other);
@@ -189,12 +269,12 @@ public:
   // Deletes every node and edge. Creation numbers are not reused afterwards.
   void clear();
 
-  node source(edge e) const { return makeHandle(e.m_pRep->source); }
-  node target(edge e) const { return makeHandle(e.m_pRep->target); }
+  node source(edge e) const { return handleOf<node>(rec(e).source); }
+  node target(edge e) const { return handleOf<node>(rec(e).target); }
   // The end of `e` that is not `v`.
   node opposite(node v, edge e) const { return source(e) == v ? target(e) : source(e); }
-  int outdeg(node v) const { return v.m_pRep->outdeg; }
-  int indeg(node v) const { return v.m_pRep->indeg; }
+  int outdeg(node v) const { return static_cast<int>(rec(v).outdeg); }
+  int indeg(node v) const { return static_cast<int>(rec(v).indeg); }
   int number_of_nodes() const { return m_NodeCount; }
   int number_of_edges() const { return m_EdgeCount; }
   bool empty() const { return m_NodeCount == 0; }
@@ -207,23 +287,23 @@ public:
   int max_edge_index() const { return static_cast<int>(m_NextEdgeIndex) - 1; }
 
   // Walks in creation order; each returns nil past the end.
-  node first_node() const { return makeHandle(m_pFirstNode); }
-  node last_node() const { return makeHandle(m_pLastNode); }
-  node next_node(node v) const { return makeHandle(v.m_pRep->next); }
-  node pred_node(node v) const { return makeHandle(v.m_pRep->prev); }
-  edge first_edge() const { return makeHandle(m_pFirstEdge); }
-  edge last_edge() const { return makeHandle(m_pLastEdge); }
-  edge next_edge(edge e) const { return makeHandle(e.m_pRep->next); }
+  node first_node() const { return handleOf<node>(m_FirstNode); }
+  node last_node() const { return handleOf<node>(m_LastNode); }
+  node next_node(node v) const { return handleOf<node>(rec(v).next); }
+  node pred_node(node v) const { return handleOf<node>(rec(v).prev); }
+  edge first_edge() const { return handleOf<edge>(m_FirstEdge); }
+  edge last_edge() const { return handleOf<edge>(m_LastEdge); }
+  edge next_edge(edge e) const { return handleOf<edge>(rec(e).next); }
 
   // Walks in adjacency order.
-  edge first_adj_edge(node v) const { return makeHandle(v.m_pRep->firstOut); }
-  edge last_adj_edge(node v) const { return makeHandle(v.m_pRep->lastOut); }
-  edge adj_succ(edge e) const { return makeHandle(e.m_pRep->nextOut); }
-  edge adj_pred(edge e) const { return makeHandle(e.m_pRep->prevOut); }
-  edge first_in_edge(node v) const { return makeHandle(v.m_pRep->firstIn); }
-  edge last_in_edge(node v) const { return makeHandle(v.m_pRep->lastIn); }
-  edge in_succ(edge e) const { return makeHandle(e.m_pRep->nextIn); }
-  edge in_pred(edge e) const { return makeHandle(e.m_pRep->prevIn); }
+  edge first_adj_edge(node v) const { return handleOf<edge>(rec(v).firstOut); }
+  edge last_adj_edge(node v) const { return handleOf<edge>(rec(v).lastOut); }
+  edge adj_succ(edge e) const { return handleOf<edge>(rec(e).nextOut); }
+  edge adj_pred(edge e) const { return handleOf<edge>(rec(e).prevOut); }
+  edge first_in_edge(node v) const { return handleOf<edge>(rec(v).firstIn); }
+  edge last_in_edge(node v) const { return handleOf<edge>(rec(v).lastIn); }
+  edge in_succ(edge e) const { return handleOf<edge>(rec(e).nextIn); }
+  edge in_pred(edge e) const { return handleOf<edge>(rec(e).prevIn); }
 
   // Copies, for walks that change the graph.
   list<node> all_nodes() const;
@@ -232,28 +312,38 @@ public:
   list<edge> in_edges(node v) const;
 
   // Live views without copying. The loop body may delete the element it is given, nothing else.
-  NodeRange nodes() const { return NodeRange(m_pFirstNode); }
-  EdgeRange edges() const { return EdgeRange(m_pFirstEdge); }
-  OutEdgeRange out(node v) const { return OutEdgeRange(v.m_pRep->firstOut); }
-  InEdgeRange in(node v) const { return InEdgeRange(v.m_pRep->firstIn); }
+  NodeRange nodes() const { return NodeRange(&m_Nodes, m_FirstNode); }
+  EdgeRange edges() const { return EdgeRange(&m_Edges, m_FirstEdge); }
+  OutEdgeRange out(node v) const { return OutEdgeRange(&m_Edges, rec(v).firstOut); }
+  InEdgeRange in(node v) const { return InEdgeRange(&m_Edges, rec(v).firstIn); }
 
   // Position of `e` among the in-edges of its target (0 for the first).
   int in_position(edge e) const;
 
-  static node makeHandle(detail::NodeRep* rep) { return node::fromRep(rep); }
-  static edge makeHandle(detail::EdgeRep* rep) { return edge::fromRep(rep); }
+  // The handle of creation number `number`, nil for kNoRecord; for the graph layer itself.
+  template <class H>
+  static H handleOf(std::uint32_t number) {
+    return number == detail::kNoRecord ? H() : H::ofIndex(number);
+  }
 
 private:
-  void copyShapeFrom(const graph& other);
-  void linkOut(detail::EdgeRep* e, detail::NodeRep* v);
-  void unlinkOut(detail::EdgeRep* e);
-  void linkIn(detail::EdgeRep* e, detail::NodeRep* w);
-  void unlinkIn(detail::EdgeRep* e);
+  detail::NodeRecord& rec(node v) { return m_Nodes[v.index()]; }
+  const detail::NodeRecord& rec(node v) const { return m_Nodes[v.index()]; }
+  detail::EdgeRecord& rec(edge e) { return m_Edges[e.index()]; }
+  const detail::EdgeRecord& rec(edge e) const { return m_Edges[e.index()]; }
 
-  detail::NodeRep* m_pFirstNode = nullptr;
-  detail::NodeRep* m_pLastNode = nullptr;
-  detail::EdgeRep* m_pFirstEdge = nullptr;
-  detail::EdgeRep* m_pLastEdge = nullptr;
+  void copyShapeFrom(const graph& other);
+  void linkOut(std::uint32_t e, std::uint32_t v);
+  void unlinkOut(std::uint32_t e);
+  void linkIn(std::uint32_t e, std::uint32_t w);
+  void unlinkIn(std::uint32_t e);
+
+  detail::RecordStore<detail::NodeRecord> m_Nodes;
+  detail::RecordStore<detail::EdgeRecord> m_Edges;
+  std::uint32_t m_FirstNode = detail::kNoRecord;
+  std::uint32_t m_LastNode = detail::kNoRecord;
+  std::uint32_t m_FirstEdge = detail::kNoRecord;
+  std::uint32_t m_LastEdge = detail::kNoRecord;
   int m_NodeCount = 0;
   int m_EdgeCount = 0;
   std::uint32_t m_NextNodeIndex = 0;
@@ -263,43 +353,44 @@ private:
   PoolHold m_PoolHold;
 };
 
+namespace detail {
+template <class H, class Record, std::uint32_t Record::*Next>
+H LinkRange<H, Record, Next>::graphHandle(std::uint32_t number) {
+  return graph::handleOf<H>(number);
+}
+}  // namespace detail
+
 // A value for every node (or edge) of a graph, indexed by creation number. Entries for nodes created
 // after the array are added on first write with the array's default value.
-inline node node::fromRep(detail::NodeRep* rep) { return rep ? node(rep, rep->index) : node(); }
-inline edge edge::fromRep(detail::EdgeRep* rep) { return rep ? edge(rep, rep->index) : edge(); }
-
 template <class Handle, class T>
 class handle_array {
 public:
   handle_array() = default;
   explicit handle_array(const graph& G, const T& init = T()) { this->init(G, init); }
-  handle_array(std::size_t size, const T& init) : m_Default(init), m_Slots(size, Slot{init}) {}
+  handle_array(std::size_t size, const T& init) : m_Default(init) { m_Slots.grow(size, init); }
 
   void init(const graph& G, const T& init = T()) {
     m_Default = init;
-    m_Slots.assign(slotsFor(G), Slot{init});
+    m_Slots.clear();
+    m_Slots.grow(slotsFor(G), init);
   }
   // Sets every entry back to the default value, keeping the size.
   void fill(const T& value) {
     m_Default = value;
-    for (Slot& slot : m_Slots) slot.value = value;
+    for (std::size_t i = 0; i < m_Slots.size(); ++i) m_Slots[i] = value;
   }
 
   T& operator[](Handle h) {
-    if (h.index() >= m_Slots.size()) m_Slots.resize(h.index() + 1, Slot{m_Default});
-    return m_Slots[h.index()].value;
+    if (h.index() >= m_Slots.size()) m_Slots.grow(h.index() + 1, m_Default);
+    return m_Slots[h.index()];
   }
-  const T& operator[](Handle h) const { return h.index() < m_Slots.size() ? m_Slots[h.index()].value : m_Default; }
+  const T& operator[](Handle h) const { return h.index() < m_Slots.size() ? m_Slots[h.index()] : m_Default; }
 
 private:
-  // Boxed so that T = bool is an ordinary array of bools with real references.
-  struct Slot {
-    T value;
-  };
   static std::size_t slotsFor(const graph& G);
 
   T m_Default{};
-  std::vector<Slot, ModuleAllocator<Slot>> m_Slots;
+  detail::ChunkedArray<T> m_Slots;
 };
 
 template <class Handle, class T>
