@@ -54,12 +54,20 @@ void KvCBasicBlock::boot() { s_GlobIndexCnt = 0; }
 
 KvCBasicBlock::KvCBasicBlock() : m_Index(ssaopt::drawIndex(s_GlobIndexCnt)) {}
 
+const ssaopt::list<KvCPhiFunction*>& KvCBasicBlock::getPhiFunctions() const {
+  static const ssaopt::list<KvCPhiFunction*> kNone;
+  const ssaopt::list<KvCPhiFunction*>* pPhis = m_PhiFunctions.find();
+  return pPhis ? *pPhis : kNone;
+}
+
 void KvCBasicBlock::append(const ssaopt::list<KvCCfgStatement*>& statements) {
   m_StatementSeq.insert(m_StatementSeq.end(), statements.begin(), statements.end());
 }
 
 void KvCBasicBlock::append(const ssaopt::list<KvCPhiFunction*>& phiFunctions) {
-  m_PhiFunctions.insert(m_PhiFunctions.end(), phiFunctions.begin(), phiFunctions.end());
+  if (phiFunctions.empty()) return;
+  ssaopt::list<KvCPhiFunction*>& phis = m_PhiFunctions.get();
+  phis.insert(phis.end(), phiFunctions.begin(), phiFunctions.end());
 }
 
 // The cache is filled by the first request that finds it empty and is not refreshed by itself: a
@@ -71,7 +79,7 @@ const ssaopt::list<KvCCfgVariable*>& KvCBasicBlock::getAssignedVariables() {
 
 void KvCBasicBlock::recomputeAssignedVariables() {
   m_AssignedVariables.clear();
-  for (const KvCPhiFunction* pPhi : m_PhiFunctions)
+  for (const KvCPhiFunction* pPhi : getPhiFunctions())
     if (pPhi) m_AssignedVariables.push_back(pPhi->getVariable());
   for (const KvCCfgStatement* pStatement : m_StatementSeq) {
     ssaopt::set<KvCCfgVariable*> defined = pStatement->getDefinedVariables();
@@ -81,7 +89,7 @@ void KvCBasicBlock::recomputeAssignedVariables() {
 
 ssaopt::set<KvCCfgVariable*> KvCBasicBlock::getUsedVariables() const {
   ssaopt::set<KvCCfgVariable*> used;
-  for (const KvCPhiFunction* pPhi : m_PhiFunctions) ssaopt::insertAll(used, pPhi->getUsedVariables());
+  for (const KvCPhiFunction* pPhi : getPhiFunctions()) ssaopt::insertAll(used, pPhi->getUsedVariables());
   for (const KvCCfgStatement* pStatement : m_StatementSeq)
     ssaopt::insertAll(used, pStatement->getUsedVariables());
   if (m_pBranchCond) ssaopt::insertAll(used, m_pBranchCond->getUsedVariables());
@@ -90,7 +98,7 @@ ssaopt::set<KvCCfgVariable*> KvCBasicBlock::getUsedVariables() const {
 
 void KvCBasicBlock::del(KvCCfgStatement* pStatement) {
   if (pStatement->isPhiFunction()) {
-    if (!eraseFirst(m_PhiFunctions, pStatement)) {
+    if (!m_PhiFunctions.find() || !eraseFirst(m_PhiFunctions.get(), pStatement)) {
       KV_CONSISTENCY_CHECK(false, "0", kBasicBlock, kLineDelPhiNotFound);
       return;
     }
@@ -103,13 +111,14 @@ void KvCBasicBlock::del(KvCCfgStatement* pStatement) {
 }
 
 KvCCfgStatement* KvCBasicBlock::isStatement() const {
-  bool onlyOneStatement = m_StatementSeq.size() == 1 && m_PhiFunctions.empty() && !m_pBranchCond;
+  bool onlyOneStatement = m_StatementSeq.size() == 1 && getPhiFunctions().empty() && !m_pBranchCond;
   return onlyOneStatement ? m_StatementSeq.front() : nullptr;
 }
 
 KvCPhiFunction* KvCBasicBlock::isPhiFunction() const {
-  bool onlyOnePhi = m_PhiFunctions.size() == 1 && m_StatementSeq.empty() && !m_pBranchCond;
-  return onlyOnePhi ? m_PhiFunctions.front() : nullptr;
+  const ssaopt::list<KvCPhiFunction*>& phis = getPhiFunctions();
+  bool onlyOnePhi = phis.size() == 1 && m_StatementSeq.empty() && !m_pBranchCond;
+  return onlyOnePhi ? phis.front() : nullptr;
 }
 
 KvCBasicBlock* KvCBasicBlock::splitAtStatement(KvCCfgStatement* pStatement) {

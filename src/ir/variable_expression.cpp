@@ -1,12 +1,24 @@
 // The expression of the interface statements: a set of variables.
 #include "ssaopt/ir/variable_expression.h"
 
+#include <algorithm>
+
 #include "ssaopt/ir/variable.h"
 #include "ssaopt/values/merge.h"
 
+void KvCCfgVariableExpression::addVariable(KvCCfgVariable* pVariable) {
+  ssaopt::set_order<KvCCfgVariable*> order;
+  auto place = std::lower_bound(m_Variables.begin(), m_Variables.end(), pVariable, order);
+  if (place == m_Variables.end() || *place != pVariable) m_Variables.insert(place, pVariable);
+}
+
+ssaopt::set<KvCCfgVariable*> KvCCfgVariableExpression::getUsedVariables() const {
+  return ssaopt::set<KvCCfgVariable*>(m_Variables.begin(), m_Variables.end());
+}
+
 void KvCCfgVariableExpression::replaceVariable(KvCCfgVariable* pOld, KvCCfgVariable* pNew) {
-  m_Variables.erase(pOld);
-  m_Variables.insert(pNew);
+  m_Variables.erase(std::remove(m_Variables.begin(), m_Variables.end(), pOld), m_Variables.end());
+  addVariable(pNew);
 }
 
 // Made by the default constructor only, the expression is never marked as non-constant.

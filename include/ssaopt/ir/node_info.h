@@ -39,9 +39,10 @@ public:
   void clearDF() { m_DF.reset(); }
 
 private:
-  ssaopt::node m_Idom;
   KvCCfgProcedure* m_pProcedure = nullptr;
   ssaopt::on_demand<ssaopt::set<ssaopt::node>> m_DF;
+  // Last, so that a derived class may put a member of four bytes beside it.
+  ssaopt::node m_Idom;
 };
 
 // Phi functions, then statements in execution order, then optionally a two-way branch condition.
@@ -65,11 +66,11 @@ public:
   static void boot();
 
   const ssaopt::list<KvCCfgStatement*>& getStatementSeq() const { return m_StatementSeq; }
-  const ssaopt::list<KvCPhiFunction*>& getPhiFunctions() const { return m_PhiFunctions; }
+  const ssaopt::list<KvCPhiFunction*>& getPhiFunctions() const;
   KvCCfgExpression* getBranchCond() const { return m_pBranchCond; }
 
   void append(KvCCfgStatement* pStatement) { m_StatementSeq.push_back(pStatement); }
-  void append(KvCPhiFunction* pPhi) { m_PhiFunctions.push_back(pPhi); }
+  void append(KvCPhiFunction* pPhi) { m_PhiFunctions.get().push_back(pPhi); }
   void append(const ssaopt::list<KvCCfgStatement*>& statements);
   void append(const ssaopt::list<KvCPhiFunction*>& phiFunctions);
   // Replaces any previous condition.
@@ -103,11 +104,13 @@ private:
 
   static std::uint32_t s_GlobIndexCnt;
 
+  // First, beside the base's last member.
+  std::uint32_t m_Index;
   ssaopt::list<KvCCfgStatement*> m_StatementSeq;
-  ssaopt::list<KvCPhiFunction*> m_PhiFunctions;
+  // Only blocks at joins hold phi functions: the list is made with the first.
+  ssaopt::on_demand<ssaopt::list<KvCPhiFunction*>> m_PhiFunctions;
   KvCCfgExpression* m_pBranchCond = nullptr;
   ssaopt::list<KvCCfgVariable*> m_AssignedVariables;
-  std::uint32_t m_Index;
 };
 
 // The entry node of a procedure. It holds no statements of the program; the assignments that a client

@@ -109,14 +109,14 @@ private:
   static std::uint32_t s_GlobIndexCnt;
 
   std::uint32_t m_Index;
+  bool m_IsArray = false;
+  bool m_IsErasable = false;
+  bool m_IsVolatile = false;
   // Only original variables use the replacement stack, and few variables have virtual aliases: both
   // are made when first used.
   ssaopt::on_demand<ssaopt::stack<KvCCfgVariable*>> m_SSAReplacements;
   KvCCfgValue* m_pValue;
   ssaopt::set<ssaopt::node> m_Uses;
-  bool m_IsArray = false;
-  bool m_IsErasable = false;
-  bool m_IsVolatile = false;
   KvCCfgVariable* m_pNonVirtualAlias;
   ssaopt::on_demand<ssaopt::set<KvCCfgVariable*>> m_VirtualAliases;
 };

@@ -14,10 +14,10 @@ public:
   KvCCfgVariableExpression(const KvCCfgVariableExpression&) = default;
   KvCCfgVariableExpression& operator=(const KvCCfgVariableExpression&) = default;
 
-  void addVariable(KvCCfgVariable* pVariable) { m_Variables.insert(pVariable); }
+  void addVariable(KvCCfgVariable* pVariable);
 
   ~KvCCfgVariableExpression() override = default;
-  ssaopt::set<KvCCfgVariable*> getUsedVariables() const override { return m_Variables; }
+  ssaopt::set<KvCCfgVariable*> getUsedVariables() const override;
   // `pNew` is a member afterwards even when `pOld` was not one.
   void replaceVariable(KvCCfgVariable* pOld, KvCCfgVariable* pNew) override;
   void replaceConditionWithConstant(double) override {}
@@ -36,5 +36,7 @@ private:
   template <class Fold>
   KvCCfgValue foldMemberValues() const;
 
-  ssaopt::set<KvCCfgVariable*> m_Variables;
+  // A set in ascending variable order, held as an array: an interface statement's expression has one
+  // member, which a tree of one node would take five times the memory for.
+  ssaopt::array<KvCCfgVariable*> m_Variables;
 };
