@@ -26,214 +26,248 @@ namespace {
 // Source line of the report for a component in which every node has an in-edge.
 constexpr int kLineComponentWithoutRoot = 732;
 
-// Preorder number 0 stands for no vertex: the empty vertex of the algorithm, and "not yet numbered".
-constexpr int kNone = 0;
-
 }  // namespace
 
 // Lengauer and Tarjan, "A fast algorithm for finding dominators in a flowgraph" (TOPLAS 1979), in
 // its balanced form: link by subtree size, path compression in eval, near-linear in the edges.
 //
-// Every working array is indexed by depth-first preorder number, so a component costs its own size
-// and no hash map is involved. Number 0 is the empty vertex of the paper (semi 0, size 0, its own
-// label and ancestor), which spares adding a sentinel node to the graph. The depth-first numbering
-// and the path compression keep explicit stacks: their recursive forms go as deep as a straight
-// line of blocks is long. Both visit, number and update in exactly the order of the recursive forms.
+// The graph is read once into arrays indexed by creation number: each node's successors in adjacency
+// order and its predecessors lie in one array each, the connected components come from a union-find
+// over the edges. The working arrays are indexed by depth-first preorder number, numbered on across
+// the components (each component's search starts where the last one ended), so no array is cleared
+// between components. Number 0 is the empty vertex of the paper (semi 0, size 0, its own label and
+// ancestor), which spares a sentinel node. The depth-first numbering and the path compression keep
+// explicit stacks: their recursive forms go as deep as a straight line of blocks is long. Both visit,
+// number and update in exactly the order of the recursive forms.
 class KvCControlFlowGraph::LengauerTarjan {
 public:
-  LengauerTarjan(const KvCControlFlowGraph& G, node_array<int>& preorder) : m_G(G), m_Preorder(preorder) {}
-
-  // Sets idom[v] for every node v that `root` reaches, except the root; nothing else is written.
-  void run(node root, node_array<node>& idom) {
-    reset();
-    dfsDom(root);
-    computeSemidominators();
-    finishIdoms(idom);
+  explicit LengauerTarjan(const KvCControlFlowGraph& G)
+      : m_Nodes(static_cast<std::size_t>(G.max_node_index() + 1)) {
+    readAdjacency(G);
+    std::size_t vertices = m_Nodes + 1;
+    for (array<std::uint32_t>* pArray : {&m_Semi, &m_Label, &m_Ancestor, &m_Child, &m_Size, &m_Parent, &m_Dom,
+                                         &m_Bucket, &m_NextInBucket, &m_Vertex})
+      pArray->assign(vertices, kNone);
+    m_Preorder.assign(m_Nodes, kNone);
+    m_Idom.assign(m_Nodes, kNoNode);
+    m_Count = 0;
   }
+
+  // The connected components, edge directions ignored, numbered in the order in which the node order
+  // first meets them; per component, the last node without in-edges in node order (kNoNode when it
+  // has none).
+  array<std::uint32_t> rootsOfComponents(const KvCControlFlowGraph& G) {
+    array<std::uint32_t> representative(m_Nodes);
+    for (std::uint32_t v = 0; v < m_Nodes; ++v) representative[v] = v;
+    for (std::uint32_t v = 0; v < m_Nodes; ++v)
+      for (std::uint32_t i = m_SuccStart[v]; i < m_SuccStart[v + 1]; ++i) unite(representative, v, m_Succ[i]);
+    array<std::uint32_t> componentOf(m_Nodes, kNoNode), roots;
+    for (node v : G.nodes()) {
+      std::uint32_t r = find(representative, v.index());
+      if (componentOf[r] == kNoNode) {
+        componentOf[r] = static_cast<std::uint32_t>(roots.size());
+        roots.push_back(kNoNode);
+      }
+      if (G.indeg(v) == 0) roots[componentOf[r]] = v.index();
+    }
+    return roots;
+  }
+
+  // Sets the immediate dominator of every node that `root` reaches, except the root.
+  void run(std::uint32_t root) {
+    std::uint32_t first = m_Count + 1;
+    dfsDom(root);
+    computeSemidominators(first);
+    finishIdoms(first);
+  }
+
+  // The immediate dominator of node number `v`, kNoNode for a root and for a node no root reaches.
+  std::uint32_t idomOf(std::uint32_t v) const { return m_Idom[v]; }
+
+  static constexpr std::uint32_t kNoNode = ssaopt::detail::kNoRecord;
 
 private:
+  // Preorder number 0 stands for no vertex: the empty vertex of the algorithm, and "not yet numbered".
+  static constexpr std::uint32_t kNone = 0;
+
   struct DfsFrame {
-    node v;
-    edge next;  // the out-edge to look at when the search comes back to v
+    std::uint32_t v;     // preorder number
+    std::uint32_t next;  // position in m_Succ of the successor to look at when the search comes back
   };
 
-  void reset() {
-    for (array<int>* pArray :
-         {&m_Semi, &m_Label, &m_Ancestor, &m_Child, &m_Size, &m_Parent, &m_Dom, &m_Bucket, &m_NextInBucket})
-      pArray->assign(1, kNone);
-    m_Vertex.assign(1, nil);
-  }
-
-  int number(node v) {
-    int n = static_cast<int>(m_Vertex.size());
-    m_Preorder[v] = n;
-    m_Vertex.push_back(v);
-    m_Semi.push_back(n);
-    m_Label.push_back(n);
-    m_Size.push_back(1);
-    for (array<int>* pArray : {&m_Ancestor, &m_Child, &m_Parent, &m_Dom, &m_Bucket, &m_NextInBucket})
-      pArray->push_back(kNone);
-    return n;
-  }
-  int count() const { return static_cast<int>(m_Vertex.size()) - 1; }
-
-  // Preorder numbering along out-edges in adjacency order; a node is numbered when first reached.
-  void dfsDom(node root) {
-    m_DfsStack.clear();
-    number(root);
-    m_DfsStack.push_back({root, m_G.first_adj_edge(root)});
-    while (!m_DfsStack.empty()) {
-      DfsFrame& frame = m_DfsStack.back();
-      if (!frame.next) {
-        m_DfsStack.pop_back();
-        continue;
-      }
-      node v = frame.v;
-      node w = m_G.target(frame.next);
-      frame.next = m_G.adj_succ(frame.next);
-      if (m_Preorder[w] != kNone) continue;
-      m_Parent[static_cast<std::size_t>(number(w))] = m_Preorder[v];
-      m_DfsStack.push_back({w, m_G.first_adj_edge(w)});
+  void readAdjacency(const KvCControlFlowGraph& G) {
+    m_SuccStart.assign(m_Nodes + 1, 0);
+    m_PredStart.assign(m_Nodes + 1, 0);
+    for (node v : G.nodes()) {
+      m_SuccStart[v.index() + 1] = static_cast<std::uint32_t>(G.outdeg(v));
+      m_PredStart[v.index() + 1] = static_cast<std::uint32_t>(G.indeg(v));
+    }
+    for (std::size_t v = 0; v < m_Nodes; ++v) {
+      m_SuccStart[v + 1] += m_SuccStart[v];
+      m_PredStart[v + 1] += m_PredStart[v];
+    }
+    m_Succ.resize(m_SuccStart[m_Nodes]);
+    m_Pred.resize(m_PredStart[m_Nodes]);
+    for (node v : G.nodes()) {
+      std::uint32_t i = m_SuccStart[v.index()];
+      for (edge e : G.out(v)) m_Succ[i++] = G.target(e).index();
+      i = m_PredStart[v.index()];
+      for (edge e : G.in(v)) m_Pred[i++] = G.source(e).index();
     }
   }
 
-  // Steps 2 and 3 of the paper, vertices in decreasing preorder.
-  void computeSemidominators() {
-    for (int w = count(); w >= 2; --w) {
+  static std::uint32_t find(array<std::uint32_t>& representative, std::uint32_t v) {
+    while (representative[v] != v) v = representative[v] = representative[representative[v]];
+    return v;
+  }
+  static void unite(array<std::uint32_t>& representative, std::uint32_t v, std::uint32_t w) {
+    v = find(representative, v);
+    w = find(representative, w);
+    if (v != w) representative[std::max(v, w)] = std::min(v, w);
+  }
+
+  std::uint32_t number(std::uint32_t v, std::uint32_t parent) {
+    std::uint32_t n = ++m_Count;
+    m_Preorder[v] = n;
+    m_Vertex[n] = v;
+    m_Semi[n] = m_Label[n] = n;
+    m_Size[n] = 1;
+    m_Parent[n] = parent;
+    m_Ancestor[n] = m_Child[n] = m_Dom[n] = m_Bucket[n] = m_NextInBucket[n] = kNone;
+    return n;
+  }
+
+  // Preorder numbering along out-edges in adjacency order; a node is numbered when first reached.
+  void dfsDom(std::uint32_t root) {
+    m_DfsStack.clear();
+    m_DfsStack.push_back({number(root, kNone), m_SuccStart[root]});
+    while (!m_DfsStack.empty()) {
+      DfsFrame& frame = m_DfsStack.back();
+      std::uint32_t v = m_Vertex[frame.v];
+      if (frame.next == m_SuccStart[v + 1]) {
+        m_DfsStack.pop_back();
+        continue;
+      }
+      std::uint32_t w = m_Succ[frame.next++];
+      if (m_Preorder[w] != kNone) continue;
+      std::uint32_t n = number(w, frame.v);
+      m_DfsStack.push_back({n, m_SuccStart[w]});
+    }
+  }
+
+  // Steps 2 and 3 of the paper, vertices in decreasing preorder. The members of a bucket may be
+  // settled in any order: eval's answers do not depend on the compressions that other evals did.
+  void computeSemidominators(std::uint32_t first) {
+    for (std::uint32_t w = m_Count; w > first; --w) {
       lowerSemiFromPredecessors(w);
-      addToBucket(at(m_Semi, w), w);
-      link(at(m_Parent, w), w);
-      settleBucket(at(m_Parent, w));
+      m_NextInBucket[w] = m_Bucket[m_Semi[w]];
+      m_Bucket[m_Semi[w]] = w;
+      std::uint32_t p = m_Parent[w];
+      link(p, w);
+      for (std::uint32_t v = m_Bucket[p]; v != kNone; v = m_NextInBucket[v]) {
+        std::uint32_t u = eval(v);
+        m_Dom[v] = m_Semi[u] < m_Semi[v] ? u : p;
+      }
+      m_Bucket[p] = kNone;
     }
   }
 
   // A predecessor that the root does not reach lies on no path from the root, so it cannot lower
   // the semidominator; it is left out (the algorithm assumes every node reachable).
-  void lowerSemiFromPredecessors(int w) {
-    for (edge e : m_G.in(vertex(w))) {
-      int source = m_Preorder[m_G.source(e)];
+  void lowerSemiFromPredecessors(std::uint32_t w) {
+    std::uint32_t v = m_Vertex[w];
+    for (std::uint32_t i = m_PredStart[v]; i < m_PredStart[v + 1]; ++i) {
+      std::uint32_t source = m_Preorder[m_Pred[i]];
       if (source == kNone) continue;
-      int u = eval(source);
-      if (at(m_Semi, u) < at(m_Semi, w)) at(m_Semi, w) = at(m_Semi, u);
-    }
-  }
-
-  void addToBucket(int owner, int w) {
-    at(m_NextInBucket, w) = at(m_Bucket, owner);
-    at(m_Bucket, owner) = w;
-  }
-
-  // Empties the bucket of p, its members taken in ascending node order.
-  void settleBucket(int p) {
-    m_Settling.clear();
-    for (int v = at(m_Bucket, p); v != kNone; v = at(m_NextInBucket, v)) m_Settling.push_back(v);
-    at(m_Bucket, p) = kNone;
-    std::sort(m_Settling.begin(), m_Settling.end(), [this](int a, int b) { return vertex(a) < vertex(b); });
-    for (int v : m_Settling) {
-      int u = eval(v);
-      at(m_Dom, v) = at(m_Semi, u) < at(m_Semi, v) ? u : p;
+      std::uint32_t u = eval(source);
+      if (m_Semi[u] < m_Semi[w]) m_Semi[w] = m_Semi[u];
     }
   }
 
   // Step 4 of the paper, vertices in increasing preorder.
-  void finishIdoms(node_array<node>& idom) {
-    for (int w = 2; w <= count(); ++w)
-      if (at(m_Dom, w) != at(m_Semi, w)) at(m_Dom, w) = at(m_Dom, at(m_Dom, w));
-    for (int w = 2; w <= count(); ++w) idom[vertex(w)] = vertex(at(m_Dom, w));
+  void finishIdoms(std::uint32_t first) {
+    for (std::uint32_t w = first + 1; w <= m_Count; ++w)
+      if (m_Dom[w] != m_Semi[w]) m_Dom[w] = m_Dom[m_Dom[w]];
+    for (std::uint32_t w = first + 1; w <= m_Count; ++w) m_Idom[m_Vertex[w]] = m_Vertex[m_Dom[w]];
   }
 
-  void link(int v, int w) {
-    int s = w;
-    while (semiOfLabel(w) < semiOfLabel(child(s))) {
-      if (size(s) + size(child(child(s))) >= 2 * size(child(s))) {
-        at(m_Ancestor, child(s)) = s;
-        at(m_Child, s) = child(child(s));
+  void link(std::uint32_t v, std::uint32_t w) {
+    std::uint32_t s = w;
+    while (semiOfLabel(w) < semiOfLabel(m_Child[s])) {
+      std::uint32_t child = m_Child[s];
+      if (m_Size[s] + m_Size[m_Child[child]] >= 2 * m_Size[child]) {
+        m_Ancestor[child] = s;
+        m_Child[s] = m_Child[child];
       } else {
-        at(m_Size, child(s)) = size(s);
-        at(m_Ancestor, s) = child(s);
-        s = child(s);
+        m_Size[child] = m_Size[s];
+        m_Ancestor[s] = child;
+        s = child;
       }
     }
-    at(m_Label, s) = at(m_Label, w);
-    at(m_Size, v) += size(w);
-    if (size(v) < 2 * size(w)) std::swap(s, at(m_Child, v));
-    while (s != kNone) {
-      at(m_Ancestor, s) = v;
-      s = child(s);
-    }
+    m_Label[s] = m_Label[w];
+    m_Size[v] += m_Size[w];
+    if (m_Size[v] < 2 * m_Size[w]) std::swap(s, m_Child[v]);
+    for (; s != kNone; s = m_Child[s]) m_Ancestor[s] = v;
   }
 
-  int eval(int v) {
-    if (ancestor(v) == kNone) return at(m_Label, v);
+  std::uint32_t eval(std::uint32_t v) {
+    if (m_Ancestor[v] == kNone) return m_Label[v];
     compress(v);
-    return semiOfLabel(ancestor(v)) < semiOfLabel(v) ? at(m_Label, ancestor(v)) : at(m_Label, v);
+    std::uint32_t a = m_Ancestor[v];
+    return semiOfLabel(a) < semiOfLabel(v) ? m_Label[a] : m_Label[v];
   }
 
   // The recursive form compresses the ancestor first and then v; the path is collected upwards and
   // then handled from its top down, which is the order in which the recursion unwinds.
-  void compress(int v) {
+  void compress(std::uint32_t v) {
     m_Path.clear();
-    for (int u = v; ancestor(ancestor(u)) != kNone; u = ancestor(u)) m_Path.push_back(u);
-    while (!m_Path.empty()) {
-      int u = m_Path.back();
-      m_Path.pop_back();
-      if (semiOfLabel(ancestor(u)) < semiOfLabel(u)) at(m_Label, u) = at(m_Label, ancestor(u));
-      at(m_Ancestor, u) = ancestor(ancestor(u));
+    for (std::uint32_t u = v; m_Ancestor[m_Ancestor[u]] != kNone; u = m_Ancestor[u]) m_Path.push_back(u);
+    for (auto it = m_Path.rbegin(); it != m_Path.rend(); ++it) {
+      std::uint32_t u = *it, a = m_Ancestor[u];
+      if (semiOfLabel(a) < semiOfLabel(u)) m_Label[u] = m_Label[a];
+      m_Ancestor[u] = m_Ancestor[a];
     }
   }
 
-  static int& at(array<int>& values, int i) { return values[static_cast<std::size_t>(i)]; }
-  node vertex(int i) const { return m_Vertex[static_cast<std::size_t>(i)]; }
-  int ancestor(int v) { return at(m_Ancestor, v); }
-  int child(int v) { return at(m_Child, v); }
-  int size(int v) { return at(m_Size, v); }
-  int semiOfLabel(int v) { return at(m_Semi, at(m_Label, v)); }
+  std::uint32_t semiOfLabel(std::uint32_t v) const { return m_Semi[m_Label[v]]; }
 
-  const KvCControlFlowGraph& m_G;
-  // Graph-wide, kNone for nodes not numbered yet. Components are disjoint, so one array serves all.
-  node_array<int>& m_Preorder;
-  array<node> m_Vertex;
-  array<int> m_Semi, m_Label, m_Ancestor, m_Child, m_Size, m_Parent;
+  std::size_t m_Nodes;  // creation numbers, deleted nodes' included
+  array<std::uint32_t> m_SuccStart, m_Succ, m_PredStart, m_Pred;
+  array<std::uint32_t> m_Preorder;  // by node number, kNone before the search reaches it
+  array<std::uint32_t> m_Idom;      // by node number
+  std::uint32_t m_Count = 0;        // the vertices numbered so far
+  // By preorder number.
+  array<std::uint32_t> m_Vertex, m_Semi, m_Label, m_Ancestor, m_Child, m_Size, m_Parent;
   // The immediate dominator once finishIdoms is done; the relative dominator before.
-  array<int> m_Dom;
+  array<std::uint32_t> m_Dom;
   // Buckets as singly linked lists: the first member per vertex, the next member per member.
-  array<int> m_Bucket, m_NextInBucket;
+  array<std::uint32_t> m_Bucket, m_NextInBucket;
   array<DfsFrame> m_DfsStack;
-  array<int> m_Path;
-  array<int> m_Settling;
+  array<std::uint32_t> m_Path;
 };
 
 // ---- Immediate dominators ------------------------------------------------------------------------
 
 void KvCControlFlowGraph::computeAllIdoms() {
-  node_array<int> component;
-  int count = COMPONENTS(*this, component);
-  array<array<node>> members(static_cast<std::size_t>(count));
-  for (node v : nodes()) members[static_cast<std::size_t>(component[v])].push_back(v);
-
-  node_array<int> preorder(*this, kNone);
-  node_array<node> idom(*this, nil);
-  LengauerTarjan dominators(*this, preorder);
-  for (const array<node>& nodesOfComponent : members) {
-    computeIdomsFast(nodesOfComponent, dominators, idom);
-    for (node v : nodesOfComponent)
-      if (KvCCfgNodeInfo* pInf = inf(v)) pInf->setIdom(idom[v]);
+  LengauerTarjan dominators(*this);
+  for (std::uint32_t root : dominators.rootsOfComponents(*this)) computeIdomsFast(root, dominators);
+  for (node v : nodes()) {
+    KvCCfgNodeInfo* pInf = inf(v);
+    if (!pInf) continue;
+    std::uint32_t idom = dominators.idomOf(v.index());
+    pInf->setIdom(idom == LengauerTarjan::kNoNode ? node() : handleOf<node>(idom));
   }
 }
 
-// The root is the last node without in-edges. A component without one (a cycle that nothing
-// enters) is reported and keeps nil as every node's immediate dominator. Having no entry node
-// either, its dominator tree gets no root, and frontiers, phi placement and renaming pass it by.
-void KvCControlFlowGraph::computeIdomsFast(const array<node>& nodes, LengauerTarjan& dominators,
-                                           node_array<node>& idom) {
-  node root = nil;
-  for (node v : nodes)
-    if (indeg(v) == 0) root = v;
-  if (!root) {
+// A component without a node free of in-edges (a cycle that nothing enters) is reported and keeps
+// nil as every node's immediate dominator. Having no entry node either, its dominator tree gets no
+// root, and frontiers, phi placement and renaming pass it by.
+void KvCControlFlowGraph::computeIdomsFast(std::uint32_t root, LengauerTarjan& dominators) {
+  if (root == LengauerTarjan::kNoNode) {
     reportInternalFault(kLineComponentWithoutRoot);
     return;
   }
-  dominators.run(root, idom);
+  dominators.run(root);
 }
 
 node KvCControlFlowGraph::idomOf(node v) const {

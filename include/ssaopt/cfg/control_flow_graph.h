@@ -225,9 +225,9 @@ private:
   friend class KvCControlFlowGraphSSATestAccess;
   class LengauerTarjan;
 
-  // Immediate dominators of one component, given as its nodes in node order.
-  void computeIdomsFast(const ssaopt::array<ssaopt::node>& nodes, LengauerTarjan& dominators,
-                        ssaopt::node_array<ssaopt::node>& idom);
+  // Immediate dominators of the component whose root (its last node without in-edges) has the
+  // creation number `root`; a component without one is reported.
+  void computeIdomsFast(std::uint32_t root, LengauerTarjan& dominators);
   // One tree per component, in component numbering, rooted at the component's entry node; returns
   // the number of trees. freeDominatorTrees deletes them again.
   int buildDominatorTrees(ssaopt::array<KvCDominatorTree*>& trees);
