@@ -2,7 +2,9 @@
 # Installs the Debian packages the project needs to build and test, when any is missing.
 set -euo pipefail
 
-packages=(g++ cmake ninja-build libgtest-dev libgmock-dev libbenchmark-dev graphviz clang libclang-rt-14-dev)
+# graphviz: the pictures (--emit=dot, the HTML report); chromium: the test that loads the HTML report.
+packages=(g++ cmake ninja-build libgtest-dev libgmock-dev libbenchmark-dev graphviz chromium clang
+  libclang-rt-14-dev)
 
 missing=()
 for package in "${packages[@]}"; do
