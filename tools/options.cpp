@@ -74,12 +74,10 @@ std::vector<std::string> splitAtCommas(const std::string& list) {
 // A whole number of at least `least`; an error or "".
 std::string parseCount(const std::string& name, const std::string& text, std::uint64_t least,
                        std::optional<std::uint64_t>& count) {
+  bool digits = !text.empty() && text.find_first_not_of("0123456789") == std::string::npos;
   errno = 0;
-  std::uint64_t number = 0;
-  if (!text.empty() && text.find_first_not_of("0123456789") == std::string::npos)
-    number = std::strtoull(text.c_str(), nullptr, 10);
-  if (text.empty() || text.find_first_not_of("0123456789") != std::string::npos || errno != 0)
-    return name + " needs a whole number, not '" + text + "'";
+  std::uint64_t number = digits ? std::strtoull(text.c_str(), nullptr, 10) : 0;
+  if (!digits || errno != 0) return name + " needs a whole number, not '" + text + "'";
   if (number < least) return name + " needs at least " + std::to_string(least);
   count = number;
   return "";
