@@ -345,6 +345,10 @@ private:
       std::string error = checkPrintedPasses(printed.first, *printed.second, pipeline);
       if (!error.empty()) return error;
     }
+    bool forTheDefaultCommands = options.passes || options.runs || options.steps || options.seed;
+    if (options.command == Command::Reduce && !options.reduceCommand.empty() && forTheDefaultCommands)
+      return "--passes, --runs, --steps and --seed of reduce go to check and cc-check, which the command "
+             "after -- replaces";
     if (options.filterProcedure && options.emit == Emit::C)
       return "--filter-procedure does not apply to --emit=c, which needs the whole program";
     return "";

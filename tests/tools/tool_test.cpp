@@ -73,7 +73,8 @@ TEST(ToolUsage, AWrongCommandLineIsOneLineAndStatusTwo) {
            "--passes=sccp " + loop, "--passes=ssa,inline " + loop, "fuzz --passes=ssa,divide,propagate",
            // Printing around a pass that does not run, or does not exist.
            "--passes=ssa --print-after=divide " + loop, "--print-before=nosuch " + loop,
-           "--emit=c --filter-procedure=#main " + loop, "reduce " + loop + " --"})
+           "--emit=c --filter-procedure=#main " + loop, "reduce " + loop + " --",
+           "reduce " + loop + " --runs=3 -- false"})
     expectMisuse(arguments);
   EXPECT_EQ(ssaopt("--frobnicate x.ssa").err, "ssaopt: unknown option '--frobnicate' (ssaopt --help shows the usage)\n");
   EXPECT_EQ(ssaopt("no/such/file.ssa").err,
