@@ -114,15 +114,13 @@ struct OptionSpec {
 
 const OptionSpec kOptions[] = {
     {"--passes", "LIST", kMain | kRun | kCheck | kCcCheck | kReduce | kFuzz,
-     "run these passes in order (comma-separated) instead of the default pipeline below;\n"
-     "--passes= runs none (run: none unless given)",
+     "run these passes in order (comma-separated) instead of the default pipeline below; --passes= runs none (run: none unless given)",
      [](Options& options, const std::string& value) {
        options.passes = splitAtCommas(value);
        return std::string();
      }},
     {"--emit", "FORMAT", kMain,
-     "write the result as program text (text, the default), as a Graphviz digraph (dot),\n"
-     "as a C99 translation unit (c), or as an HTML report of every step (html)",
+     "write the result as program text (text, the default), as a Graphviz digraph (dot), as a C99 translation unit (c), or as an HTML report of every step (html)",
      [](Options& options, const std::string& value) {
        return parseChoice<Emit>("--emit", value,
                                 {{"text", Emit::Text}, {"dot", Emit::Dot}, {"c", Emit::C}, {"html", Emit::Html}},
@@ -155,27 +153,25 @@ const OptionSpec kOptions[] = {
        return std::string();
      }},
     {"--print-changed", nullptr, kMain,
-     "print what each pass that changed the program changed, as a unified diff, to standard\nerror",
+     "print what each pass that changed the program changed, as a unified diff, to standard error",
      [](Options& options, const std::string&) {
        options.printChanged = true;
        return std::string();
      }},
     {"--filter-procedure", "NAME", kMain,
-     "print only procedure NAME: in the output (text, dot, html) and in what the --print\noptions print",
+     "print only procedure NAME: in the output (text, dot, html) and in what the --print options print",
      [](Options& options, const std::string& value) {
        options.filterProcedure = value;
        return value.empty() ? std::string("--filter-procedure needs a procedure name") : std::string();
      }},
     {"--verify", nullptr, kMain,
-     "check the graph after every pass with internal checks on; report every internal error\n"
-     "and consistency failure and exit with 1",
+     "check the graph after every pass with internal checks on; report every internal error and consistency failure and exit with 1",
      [](Options& options, const std::string&) {
        options.verify = true;
        return std::string();
      }},
     {"--stats", nullptr, kMain,
-     "count procedures, blocks, statements and phi functions before and after, constants\n"
-     "found and definitions removed",
+     "count procedures, blocks, statements and phi functions before and after, constants found and definitions removed",
      [](Options& options, const std::string&) {
        options.stats = true;
        return std::string();
@@ -190,19 +186,16 @@ const OptionSpec kOptions[] = {
     {"--runs", "R", kCheck | kCcCheck | kReduce, "runs, each on its own input streams (default 20)",
      [](Options& options, const std::string& value) { return parseCount("--runs", value, 1, options.runs); }},
     {"--seed", "S", kRun | kCheck | kCcCheck | kReduce | kGenerate | kFuzz,
-     "seed of the input streams, run r using S + r (default 1); of generate and fuzz, the\n"
-     "(first) program",
+     "seed of the input streams, run r using S + r (default 1); of generate and fuzz, the (first) program",
      [](Options& options, const std::string& value) { return parseCount("--seed", value, 0, options.seed); }},
     {"--inputs", "VALUES", kRun,
-     "run on the values in file VALUES (- for standard input), a line NAME V1 V2 ... per\n"
-     "input, instead of seeded streams",
+     "run on the values in file VALUES (- for standard input), a line NAME V1 V2 ... per input, instead of seeded streams",
      [](Options& options, const std::string& value) {
        options.inputsPath = value;
        return std::string();
      }},
     {"--match", "TEXT", kReduce,
-     "count a failure as the same only when the command's output shows TEXT (instead of\n"
-     "the first line of the original failure)",
+     "count a failure as the same only when the command's output shows TEXT (instead of the first line of the original failure)",
      [](Options& options, const std::string& value) {
        options.match = value;
        return std::string();
@@ -214,7 +207,7 @@ const OptionSpec kOptions[] = {
        return parseCount("--programs", value, 1, options.programs);
      }},
     {"--color", "WHEN", kReadingAProgram,
-     "colour diagnostics: auto (when standard error is a terminal, the default), always or\nnever",
+     "colour diagnostics: auto (when standard error is a terminal, the default), always or never",
      [](Options& options, const std::string& value) {
        return parseChoice<ColourMode>(
            "--color", value, {{"auto", ColourMode::Auto}, {"always", ColourMode::Always}, {"never", ColourMode::Never}},
@@ -383,14 +376,25 @@ std::string spelling(const OptionSpec& option) {
   return std::string(option.name) + (startsWith(option.name, "--") ? "=" : " ") + option.value;
 }
 
+// The option, then its help and the commands that take it, wrapped to the width of a terminal.
 void writeOptionHelp(std::ostream& text, const OptionSpec& option) {
-  std::istringstream lines(option.help);
-  std::string line;
-  std::getline(lines, line);
-  text << "  " << std::left << std::setw(22) << spelling(option) << " " << line << "\n";
-  while (std::getline(lines, line)) text << std::string(25, ' ') << line << "\n";
-  if (option.commands != kAll)
-    text << std::string(25, ' ') << "(" << namesOf(option.commands) << ")\n";
+  constexpr std::size_t kIndent = 27, kWidth = 80;
+  std::string help = option.help;
+  if (option.commands != kAll) help += " (" + namesOf(option.commands) + ")";
+  std::string line = "  " + spelling(option);
+  line += std::string(line.size() < kIndent ? kIndent - line.size() : 1, ' ');
+  std::istringstream words(help);
+  bool first = true;
+  for (std::string word; words >> word; first = false) {
+    if (!first && line.size() + 1 + word.size() > kWidth) {
+      text << line << "\n";
+      line = std::string(kIndent, ' ');
+    } else if (!first) {
+      line += ' ';
+    }
+    line += word;
+  }
+  text << line << "\n";
 }
 
 }  // namespace
