@@ -12,6 +12,7 @@
 // Needs SSA form and divided blocks (one phi function, one statement or the condition alone).
 #include <cstring>
 
+#include "graph_mechanism.h"
 #include "phi_merge.h"
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/ir/expression.h"
@@ -24,6 +25,8 @@
 using ssaopt::array;
 using ssaopt::edge;
 using ssaopt::node;
+using ssaopt::cfg::firstCfgOutEdge;
+using ssaopt::cfg::nextCfgOutEdge;
 using ssaopt::cfg::PhiMerge;
 
 namespace {
@@ -190,7 +193,7 @@ public:
   }
 
   void appendCfgOutEdges(node v, EdgeWorkList& workList) const {
-    for (edge e = m_G.firstCfgOutEdge(v); e; e = m_G.nextCfgOutEdge(e)) workList.push_back(e);
+    for (edge e = firstCfgOutEdge(m_G, v); e; e = nextCfgOutEdge(m_G, e)) workList.push_back(e);
   }
 
   void appendSSAOutEdges(node v, EdgeWorkList& workList) const {
@@ -226,7 +229,7 @@ public:
   // the parameter statements of the procedure it calls.
   void unsettleProceduresOfDeadBlock(node n) {
     unsettleProcedureOf(n);
-    for (edge e = m_G.firstCfgOutEdge(n); e; e = m_G.nextCfgOutEdge(e)) unsettleProcedureOf(m_G.target(e));
+    for (edge e = firstCfgOutEdge(m_G, n); e; e = nextCfgOutEdge(m_G, e)) unsettleProcedureOf(m_G.target(e));
     for (KvCCfgStatement* pStatement : m_G.getBasicBlock(n)->getStatementSeq())
       if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall())
         if (KvCCfgProcedure* pCallee = m_G.findProcedure(pCall->getName()))
@@ -260,7 +263,7 @@ private:
       while (!stack.empty()) {
         node v = stack.back();
         stack.pop_back();
-        for (edge e = m_G.firstCfgOutEdge(v); e; e = m_G.nextCfgOutEdge(e)) {
+        for (edge e = firstCfgOutEdge(m_G, v); e; e = nextCfgOutEdge(m_G, e)) {
           node w = m_G.target(e);
           if (m_ProcedureOf[w] != kNone) continue;
           m_ProcedureOf[w] = procedure;
@@ -468,7 +471,7 @@ void KvCControlFlowGraph::visitBranchCondition(KvCCfgExpression* pCond, node v, 
     return;
   }
   bool taken = condition.getValue() != 0.0;
-  for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) {
+  for (edge e = firstCfgOutEdge(*this, v); e; e = nextCfgOutEdge(*this, e)) {
     KvCCfgEdgeInfo* pInf = inf(e);
     if (taken ? pInf->isTrueBranch() != nullptr : pInf->isFalseBranch() != nullptr) cfgWorkList.push_back(e);
   }
@@ -498,7 +501,7 @@ int KvCControlFlowGraph::countExecutableInEdges(node v) const { return m_pPropag
 
 int KvCControlFlowGraph::countCfgOutEdges(node v) const {
   int count = 0;
-  for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) ++count;
+  for (edge e = firstCfgOutEdge(*this, v); e; e = nextCfgOutEdge(*this, e)) ++count;
   return count;
 }
 

@@ -8,6 +8,7 @@
 // Needs divided blocks and the visited marks of the pass that has just ended.
 #include <algorithm>
 
+#include "graph_mechanism.h"
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/ir/statement.h"
 #include "ssaopt/ir/variable.h"
@@ -16,6 +17,8 @@ using ssaopt::array;
 using ssaopt::edge;
 using ssaopt::nil;
 using ssaopt::node;
+using ssaopt::cfg::firstCfgOutEdge;
+using ssaopt::cfg::nextCfgOutEdge;
 
 class KvCControlFlowGraph::DeadCodeSweep {
 public:
@@ -26,7 +29,7 @@ public:
 
   // A reached phi node that a control-flow edge of `v` leads to, or nil.
   node reachedPhiSuccessor(node v) const {
-    for (edge e = m_G.firstCfgOutEdge(v); e; e = m_G.nextCfgOutEdge(e)) {
+    for (edge e = firstCfgOutEdge(m_G, v); e; e = nextCfgOutEdge(m_G, e)) {
       node t = m_G.target(e);
       if (m_G.isVisited(t) && phiFunctionAt(t)) return t;
     }
@@ -82,7 +85,7 @@ private:
   // operand per in-edge of t. The walk follows only the links it made: a block that held nothing but
   // phi functions is followed by another join, whose phi functions belong to other edges.
   node nextPhiChainLink(node link) const {
-    edge next = m_G.firstCfgOutEdge(link);
+    edge next = firstCfgOutEdge(m_G, link);
     return next && m_G.m_DividedBlockLinks[next] ? m_G.target(next) : nil;
   }
 

@@ -10,6 +10,7 @@
 #include <algorithm>
 #include <cstddef>
 
+#include "graph_mechanism.h"
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/frame/graph_algorithms.h"
 #include "ssaopt/frame/report.h"
@@ -20,11 +21,33 @@ using ssaopt::edge;
 using ssaopt::nil;
 using ssaopt::node;
 using ssaopt::node_array;
+using ssaopt::cfg::reportInternalFault;
 
 namespace {
 
 // Source line of the report for a component in which every node has an in-edge.
 constexpr int kLineComponentWithoutRoot = 732;
+
+node idomOf(const KvCControlFlowGraph& G, node v) {
+  const KvCCfgNodeInfo* pInf = G.inf(v);
+  return pInf ? pInf->getIdom() : nil;
+}
+
+// The local rule over the node's successors, then the up rule over its children's frontiers.
+void fillFrontier(const KvCControlFlowGraph& G, const KvCDominatorTree& tree, node t) {
+  node x = tree.inf(t);
+  KvCCfgNodeInfo* pInf = G.inf(x);
+  if (!pInf) return;
+  for (edge e : G.out(x))
+    if (idomOf(G, G.target(e)) != x) pInf->getDF()->insert(G.target(e));
+  for (edge treeEdge : tree.out(t)) {
+    KvCCfgNodeInfo* pChild = G.inf(tree.inf(tree.target(treeEdge)));
+    const ssaopt::set<node>* pChildFrontier = pChild ? pChild->frontierIfAny() : nullptr;
+    if (!pChildFrontier) continue;
+    for (node y : *pChildFrontier)
+      if (idomOf(G, y) != x) pInf->getDF()->insert(y);
+  }
+}
 
 }  // namespace
 
@@ -270,11 +293,6 @@ void KvCControlFlowGraph::computeIdomsFast(std::uint32_t root, LengauerTarjan& d
   dominators.run(root);
 }
 
-node KvCControlFlowGraph::idomOf(node v) const {
-  const KvCCfgNodeInfo* pInf = inf(v);
-  return pInf ? pInf->getIdom() : nil;
-}
-
 // ---- Dominator trees -----------------------------------------------------------------------------
 
 // Tree nodes are made in node order, so every node's children hang in node order. A node without
@@ -301,7 +319,7 @@ int KvCControlFlowGraph::buildDominatorTrees(array<KvCDominatorTree*>& trees) {
       KvCCfgNodeInfo* pInf = inf(v);
       if (pInf && pInf->isEntryNode())
         tree.setRoot(t);
-      else if (node dominator = idomOf(v))
+      else if (node dominator = idomOf(*this, v))
         tree.new_edge(image[dominator], t);
     }
   }
@@ -327,21 +345,6 @@ void KvCControlFlowGraph::computeDominanceFrontiers(array<KvCDominatorTree*>& tr
     if (!pTree->getRoot()) continue;
     node_array<int> dist(*pTree, -1);
     ssaopt::list<node> order = BFS(*pTree, pTree->getRoot(), dist);
-    for (; !order.empty(); order.pop_back()) fillFrontier(*pTree, order.back());
-  }
-}
-
-void KvCControlFlowGraph::fillFrontier(const KvCDominatorTree& tree, node t) {
-  node x = tree.inf(t);
-  KvCCfgNodeInfo* pInf = inf(x);
-  if (!pInf) return;
-  for (edge e : out(x))
-    if (idomOf(target(e)) != x) pInf->getDF()->insert(target(e));
-  for (edge treeEdge : tree.out(t)) {
-    KvCCfgNodeInfo* pChild = inf(tree.inf(tree.target(treeEdge)));
-    const ssaopt::set<node>* pChildFrontier = pChild ? pChild->frontierIfAny() : nullptr;
-    if (!pChildFrontier) continue;
-    for (node y : *pChildFrontier)
-      if (idomOf(y) != x) pInf->getDF()->insert(y);
+    for (; !order.empty(); order.pop_back()) fillFrontier(*this, *pTree, order.back());
   }
 }

@@ -11,6 +11,7 @@
 // Needs: a payload on every node and edge.
 #include <cstddef>
 
+#include "graph_mechanism.h"
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/frame/graph_algorithms.h"
 #include "ssaopt/frame/report.h"
@@ -19,10 +20,16 @@
 #include "ssaopt/ir/statement.h"
 
 using ssaopt::edge;
+using ssaopt::edge_array;
 using ssaopt::list;
 using ssaopt::nil;
 using ssaopt::node;
 using ssaopt::node_array;
+using ssaopt::cfg::firstBlockOf;
+using ssaopt::cfg::kGraphClass;
+using ssaopt::cfg::newPlainEdge;
+using ssaopt::cfg::reportInternalFault;
+using ssaopt::cfg::requireBasicBlock;
 
 namespace {
 
@@ -69,17 +76,90 @@ KvCCfgProcedureCall* lastCallOf(const KvCBasicBlock& block) {
   return statements.empty() ? nullptr : statements.back()->isProcedureCall();
 }
 
+// Nodes are bucketed by component first, so each procedure looks at its own component only and the
+// check stays linear however many procedures there are.
+void reportProcedureComponentFaults(const KvCControlFlowGraph& G, const node_array<int>& component,
+                                    int count) {
+  ssaopt::array<ssaopt::array<node>> members(static_cast<std::size_t>(count));
+  for (node v : G.nodes()) members[static_cast<std::size_t>(component[v])].push_back(v);
+  for (const auto& named : G.getProcedures()) {
+    const KvCCfgProcedure* pProcedure = named.second;
+    node entry = pProcedure->getEntryNode();
+    KV_CONSISTENCY_CHECK(G.indeg(entry) == 0, "indeg(EntryNode) == 0", kGraphClass, kLineEntryHasInEdge);
+    for (node v : members[static_cast<std::size_t>(component[entry])]) {
+      const KvCCfgNodeInfo* pInf = G.inf(v);
+      KV_CONSISTENCY_CHECK(pInf && pInf->getProcedure() == pProcedure, "pInf->getProcedure() == pProcedure",
+                           kGraphClass, kLineNodeOfOtherProcedure);
+      if (G.indeg(v) == 0)
+        KV_CONSISTENCY_CHECK(v == entry, "v == EntryNode", kGraphClass, kLineSecondNodeWithoutInEdge);
+    }
+  }
+}
+
+// `pTail` is what the block split off (the block itself when it did not split). Its node takes over
+// the out-edges in their order, so true and false branches keep their payloads and places; `v`
+// keeps its in-edges and continues into it.
+node continueInNewNode(KvCControlFlowGraph& G, node v, KvCBasicBlock* pBlock, KvCBasicBlock* pTail) {
+  if (pTail == pBlock) return v;
+  node w = G.new_node(pTail);
+  while (edge e = G.first_adj_edge(v)) G.move_edge(e, w, G.target(e));
+  newPlainEdge(G, v, w);
+  return w;
+}
+
+// The chain's first node takes the in-edges in their order, so that phi operands still match them;
+// the last takes the out-edges. The old block object is left alone: its items live on in the chain.
+// The links are recorded, so that dead-code elimination can tell a chain from the next block.
+void replaceByChain(KvCControlFlowGraph& G, node v, const KvCBasicBlock& block,
+                    edge_array<bool>& dividedBlockLinks) {
+  list<KvCBasicBlock*> links = oneItemBlocks(block);
+  if (links.empty()) return;
+  node first = nil;
+  node last = nil;
+  for (KvCBasicBlock* pLink : links) {
+    node w = G.new_node(pLink);
+    if (last)
+      dividedBlockLinks[newPlainEdge(G, last, w)] = true;
+    else
+      first = w;
+    last = w;
+  }
+  while (edge e = G.first_in_edge(v)) G.move_edge(e, G.source(e), first);
+  while (edge e = G.first_adj_edge(v)) G.move_edge(e, last, G.target(e));
+  G.del_node(v);
+}
+
+// A block split off by makeProcedureAndCall ends in the call of the rest and has no successor: the
+// walk goes on at the first block of the called procedure.
+node firstBlockOfCallee(const KvCControlFlowGraph& G, node deadEnd, const KvCBasicBlock& block) {
+  if (G.outdeg(deadEnd) != 0) {
+    reportInternalFault(kLineFindBranchNotDeadEnd);
+    return nil;
+  }
+  const KvCCfgProcedureCall* pCall = lastCallOf(block);
+  if (!pCall) {
+    reportInternalFault(kLineFindBranchNoCall);
+    return nil;
+  }
+  const KvCCfgProcedure* pCallee = G.findProcedure(pCall->getName());
+  node first = pCallee ? firstBlockOf(G, *pCallee) : nil;
+  if (!first) reportInternalFault(kLineFindBranchNoCallee);
+  return first;
+}
+
 }  // namespace
 
 // ---- Shared mechanism ----------------------------------------------------------------------------
 
-void KvCControlFlowGraph::reportInternalFault(int line) {
-  KV_CONSISTENCY_CHECK(false, "0", kClassName, line);
-  ssaopt::reportInternalError(kClassName, line);
+namespace ssaopt::cfg {
+
+void reportInternalFault(int line) {
+  KV_CONSISTENCY_CHECK(false, "0", kGraphClass, line);
+  ssaopt::reportInternalError(kGraphClass, line);
 }
 
-KvCBasicBlock* KvCControlFlowGraph::requireBasicBlock(node v, int lineNoPayload, int lineNoBlock) const {
-  KvCCfgNodeInfo* pInf = inf(v);
+KvCBasicBlock* requireBasicBlock(const KvCControlFlowGraph& G, node v, int lineNoPayload, int lineNoBlock) {
+  KvCCfgNodeInfo* pInf = G.inf(v);
   if (!pInf) {
     reportInternalFault(lineNoPayload);
     return nullptr;
@@ -89,19 +169,30 @@ KvCBasicBlock* KvCControlFlowGraph::requireBasicBlock(node v, int lineNoPayload,
   return pBlock;
 }
 
-node KvCControlFlowGraph::firstBlockOf(const KvCCfgProcedure& procedure) const {
+node firstBlockOf(const KvCControlFlowGraph& G, const KvCCfgProcedure& procedure) {
   node entry = procedure.getEntryNode();
-  if (!entry || outdeg(entry) == 0) return nil;
-  return target(first_adj_edge(entry));
+  if (!entry || G.outdeg(entry) == 0) return nil;
+  return G.target(G.first_adj_edge(entry));
 }
 
-node KvCControlFlowGraph::newBlockNode(KvCCfgProcedure* pProcedure) {
+node newBlockNode(KvCControlFlowGraph& G, KvCCfgProcedure* pProcedure) {
   KvCBasicBlock* pBlock = new KvCBasicBlock();
   pBlock->setProcedure(pProcedure);
-  return new_node(pBlock);
+  return G.new_node(pBlock);
 }
 
-edge KvCControlFlowGraph::newPlainEdge(node v, node w) { return new_edge(v, w, new KvCCfgEdgeInfo()); }
+edge newPlainEdge(KvCControlFlowGraph& G, node v, node w) { return G.new_edge(v, w, new KvCCfgEdgeInfo()); }
+
+// addSSAEdges adds a node's SSA out-edges after its control-flow out-edges, so the control-flow
+// edges end at the first SSA edge: a definition with thousands of uses costs a walk over the
+// control flow no more than a jump does.
+edge firstCfgOutEdge(const KvCControlFlowGraph& G, node v) {
+  return controlFlowOrNil(G, G.first_adj_edge(v));
+}
+
+edge nextCfgOutEdge(const KvCControlFlowGraph& G, edge e) { return controlFlowOrNil(G, G.adj_succ(e)); }
+
+}  // namespace ssaopt::cfg
 
 void KvCControlFlowGraph::deleteStatement(KvCBasicBlock& block, KvCCfgStatement* pStatement) {
   m_DeletedStatements.insert(pStatement);
@@ -115,13 +206,6 @@ void KvCControlFlowGraph::forgetDeletedStatements() {
   for (const auto& entry : m_Procedures) entry.second->forgetStatements(m_DeletedStatements);
   m_DeletedStatements.clear();
 }
-
-// addSSAEdges adds a node's SSA out-edges after its control-flow out-edges, so the control-flow
-// edges end at the first SSA edge: a definition with thousands of uses costs a walk over the
-// control flow no more than a jump does.
-edge KvCControlFlowGraph::firstCfgOutEdge(node v) const { return controlFlowOrNil(*this, first_adj_edge(v)); }
-
-edge KvCControlFlowGraph::nextCfgOutEdge(edge e) const { return controlFlowOrNil(*this, adj_succ(e)); }
 
 // ---- The graph object ----------------------------------------------------------------------------
 
@@ -141,78 +225,30 @@ bool KvCControlFlowGraph::checkConsistency() const {
   node_array<int> component;
   int count = COMPONENTS(*this, component, [this](edge e) { return !inf(e) || !inf(e)->isSSAEdge(); });
   if (static_cast<std::size_t>(count) != m_Procedures.size()) return false;
-  if (ShowInternalInfo()) reportProcedureComponentFaults(component, count);
+  if (ShowInternalInfo()) reportProcedureComponentFaults(*this, component, count);
   return true;
-}
-
-// Nodes are bucketed by component first, so each procedure looks at its own component only and the
-// check stays linear however many procedures there are.
-void KvCControlFlowGraph::reportProcedureComponentFaults(const node_array<int>& component, int count) const {
-  ssaopt::array<ssaopt::array<node>> members(static_cast<std::size_t>(count));
-  for (node v : nodes()) members[static_cast<std::size_t>(component[v])].push_back(v);
-  for (const auto& named : m_Procedures) {
-    const KvCCfgProcedure* pProcedure = named.second;
-    node entry = pProcedure->getEntryNode();
-    KV_CONSISTENCY_CHECK(indeg(entry) == 0, "indeg(EntryNode) == 0", kClassName, kLineEntryHasInEdge);
-    for (node v : members[static_cast<std::size_t>(component[entry])]) {
-      const KvCCfgNodeInfo* pInf = inf(v);
-      KV_CONSISTENCY_CHECK(pInf && pInf->getProcedure() == pProcedure, "pInf->getProcedure() == pProcedure",
-                           kClassName, kLineNodeOfOtherProcedure);
-      if (indeg(v) == 0)
-        KV_CONSISTENCY_CHECK(v == entry, "v == EntryNode", kClassName, kLineSecondNodeWithoutInEdge);
-    }
-  }
 }
 
 // ---- Block surgery -------------------------------------------------------------------------------
 
 node KvCControlFlowGraph::splitAtStatement(node v, KvCCfgStatement* pStatement) {
-  KvCBasicBlock* pBlock = requireBasicBlock(v, kLineSplitAtStatementNoPayload, kLineSplitAtStatementNoBlock);
+  KvCBasicBlock* pBlock =
+      requireBasicBlock(*this, v, kLineSplitAtStatementNoPayload, kLineSplitAtStatementNoBlock);
   if (!pBlock) return v;
-  return continueInNewNode(v, pBlock, pBlock->splitAtStatement(pStatement));
+  return continueInNewNode(*this, v, pBlock, pBlock->splitAtStatement(pStatement));
 }
 
 node KvCControlFlowGraph::splitAtCondition(node v) {
-  KvCBasicBlock* pBlock = requireBasicBlock(v, kLineSplitAtConditionNoPayload, kLineSplitAtConditionNoBlock);
+  KvCBasicBlock* pBlock =
+      requireBasicBlock(*this, v, kLineSplitAtConditionNoPayload, kLineSplitAtConditionNoBlock);
   if (!pBlock) return v;
-  return continueInNewNode(v, pBlock, pBlock->splitAtCondition());
-}
-
-// `pTail` is what the block split off (the block itself when it did not split). Its node takes over
-// the out-edges in their order, so true and false branches keep their payloads and places; `v`
-// keeps its in-edges and continues into it.
-node KvCControlFlowGraph::continueInNewNode(node v, KvCBasicBlock* pBlock, KvCBasicBlock* pTail) {
-  if (pTail == pBlock) return v;
-  node w = new_node(pTail);
-  while (edge e = first_adj_edge(v)) move_edge(e, w, target(e));
-  newPlainEdge(v, w);
-  return w;
+  return continueInNewNode(*this, v, pBlock, pBlock->splitAtCondition());
 }
 
 void KvCControlFlowGraph::divideBasicBlock() {
   for (node v : all_nodes())
-    if (const KvCBasicBlock* pBlock = getBasicBlock(v)) replaceByChain(v, *pBlock);
-}
-
-// The chain's first node takes the in-edges in their order, so that phi operands still match them;
-// the last takes the out-edges. The old block object is left alone: its items live on in the chain.
-// The links are recorded, so that dead-code elimination can tell a chain from the next block.
-void KvCControlFlowGraph::replaceByChain(node v, const KvCBasicBlock& block) {
-  list<KvCBasicBlock*> links = oneItemBlocks(block);
-  if (links.empty()) return;
-  node first = nil;
-  node last = nil;
-  for (KvCBasicBlock* pLink : links) {
-    node w = new_node(pLink);
-    if (last)
-      m_DividedBlockLinks[newPlainEdge(last, w)] = true;
-    else
-      first = w;
-    last = w;
-  }
-  while (edge e = first_in_edge(v)) move_edge(e, source(e), first);
-  while (edge e = first_adj_edge(v)) move_edge(e, last, target(e));
-  del_node(v);
+    if (const KvCBasicBlock* pBlock = getBasicBlock(v))
+      replaceByChain(*this, v, *pBlock, m_DividedBlockLinks);
 }
 
 // Every node is passed at most once: a cycle of blocks without a condition (or of procedures calling
@@ -223,7 +259,7 @@ node KvCControlFlowGraph::findBranchNode(node start, KvCCfgExpression* pCond) co
   node v = start;
   int lineNoBlock = kLineFindBranchNoBlock;
   for (;;) {
-    const KvCBasicBlock* pBlock = requireBasicBlock(v, lineNoBlock, lineNoBlock);
+    const KvCBasicBlock* pBlock = requireBasicBlock(*this, v, lineNoBlock, lineNoBlock);
     if (!pBlock) return start;
     if (!passed.insert(v).second) {
       reportInternalFault(kLineFindBranchCycle);
@@ -238,26 +274,8 @@ node KvCControlFlowGraph::findBranchNode(node start, KvCCfgExpression* pCond) co
       lineNoBlock = kLineFindBranchNextNoBlock;
       continue;
     }
-    v = firstBlockOfCallee(v, *pBlock);
+    v = firstBlockOfCallee(*this, v, *pBlock);
     if (!v) return start;
     lineNoBlock = kLineFindBranchNoBlock;
   }
-}
-
-// A block split off by makeProcedureAndCall ends in the call of the rest and has no successor: the
-// walk goes on at the first block of the called procedure.
-node KvCControlFlowGraph::firstBlockOfCallee(node deadEnd, const KvCBasicBlock& block) const {
-  if (outdeg(deadEnd) != 0) {
-    reportInternalFault(kLineFindBranchNotDeadEnd);
-    return nil;
-  }
-  const KvCCfgProcedureCall* pCall = lastCallOf(block);
-  if (!pCall) {
-    reportInternalFault(kLineFindBranchNoCall);
-    return nil;
-  }
-  const KvCCfgProcedure* pCallee = findProcedure(pCall->getName());
-  node first = pCallee ? firstBlockOf(*pCallee) : nil;
-  if (!first) reportInternalFault(kLineFindBranchNoCallee);
-  return first;
 }

@@ -47,6 +47,34 @@ bool sharesAny(const Variables& a, const Variables& b) {
   return false;
 }
 
+// The walk stays on the branch: it stops where another path joins (in-degree above 1), at the next
+// branch, at anything but a block, and at a block holding more than one item. Blocks holding one
+// phi function or nothing are passed, as are statements that generate no code.
+KvCCfgStatement* nextHoistingCandidate(const KvCControlFlowGraph& G, edge& e, bool skipNext) {
+  while (e) {
+    node w = G.target(e);
+    const KvCBasicBlock* pBlock = G.getBasicBlock(w);
+    if (!pBlock || pBlock->getBranchCond() || G.indeg(w) > 1 || holdsSeveralItems(*pBlock)) return nullptr;
+    e = G.first_adj_edge(w);
+    KvCCfgStatement* s = pBlock->isStatement();
+    if (!s || !generatesCode(s)) continue;
+    if (!skipNext) return s;
+    skipNext = false;
+  }
+  return nullptr;
+}
+
+// A call defines what its procedure (with all that it calls) defines, and what its function return
+// defines.
+Variables variablesDefinedBy(const KvCControlFlowGraph& G, KvCCfgStatement* s) {
+  KvCCfgProcedureCall* pCall = s->isProcedureCall();
+  if (!pCall) return s->getDefinedVariables();
+  Variables defined = pCall->getVarsDefinedByFctReturn();
+  if (const KvCCfgProcedure* pCallee = G.findProcedure(pCall->getName()))
+    ssaopt::insertAll(defined, pCallee->getDefinedVariables());
+  return defined;
+}
+
 }  // namespace
 
 void KvCControlFlowGraph::hoistCodeOutOfIfElseBranches() {
@@ -72,8 +100,8 @@ void KvCControlFlowGraph::performCodeHoisting(node v) {
   if (!eT || !eF) return;
   bool skipNext = false;
   for (;;) {
-    KvCCfgStatement* sT = nextHoistingCandidate(eT, skipNext);
-    KvCCfgStatement* sF = sT ? nextHoistingCandidate(eF, skipNext) : nullptr;
+    KvCCfgStatement* sT = nextHoistingCandidate(*this, eT, skipNext);
+    KvCCfgStatement* sF = sT ? nextHoistingCandidate(*this, eF, skipNext) : nullptr;
     if (!sF || !sT->generatesSameCode(sF) || !checkForHoisting(sF, cond) ||
         !sF->hoistOutOfIfElseBranch(skipNext))
       return;
@@ -81,37 +109,9 @@ void KvCControlFlowGraph::performCodeHoisting(node v) {
   }
 }
 
-// The walk stays on the branch: it stops where another path joins (in-degree above 1), at the next
-// branch, at anything but a block, and at a block holding more than one item. Blocks holding one
-// phi function or nothing are passed, as are statements that generate no code.
-KvCCfgStatement* KvCControlFlowGraph::nextHoistingCandidate(edge& e, bool skipNext) const {
-  while (e) {
-    node w = target(e);
-    const KvCBasicBlock* pBlock = getBasicBlock(w);
-    if (!pBlock || pBlock->getBranchCond() || indeg(w) > 1 || holdsSeveralItems(*pBlock)) return nullptr;
-    e = first_adj_edge(w);
-    KvCCfgStatement* s = pBlock->isStatement();
-    if (!s || !generatesCode(s)) continue;
-    if (!skipNext) return s;
-    skipNext = false;
-  }
-  return nullptr;
-}
-
 bool KvCControlFlowGraph::checkForHoisting(KvCCfgStatement* s, KvCCfgExpression* cond) const {
   if (cond->hasSideEffects()) return false;
-  return !sharesAny(originalsOf(variablesDefinedBy(s)), originalsOf(cond->getUsedVariables()));
-}
-
-// A call defines what its procedure (with all that it calls) defines, and what its function return
-// defines.
-Variables KvCControlFlowGraph::variablesDefinedBy(KvCCfgStatement* s) const {
-  KvCCfgProcedureCall* pCall = s->isProcedureCall();
-  if (!pCall) return s->getDefinedVariables();
-  Variables defined = pCall->getVarsDefinedByFctReturn();
-  if (const KvCCfgProcedure* pCallee = findProcedure(pCall->getName()))
-    ssaopt::insertAll(defined, pCallee->getDefinedVariables());
-  return defined;
+  return !sharesAny(originalsOf(variablesDefinedBy(*this, s)), originalsOf(cond->getUsedVariables()));
 }
 
 // Constant propagation rebuilds the SSA edges when it runs again; until then the graph holds control

@@ -14,6 +14,7 @@
 #include <algorithm>
 #include <cstddef>
 
+#include "graph_mechanism.h"
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/frame/graph_algorithms.h"
 #include "ssaopt/frame/report.h"
@@ -26,6 +27,12 @@ using ssaopt::list;
 using ssaopt::nil;
 using ssaopt::node;
 using ssaopt::node_array;
+using ssaopt::cfg::firstBlockOf;
+using ssaopt::cfg::kGraphClass;
+using ssaopt::cfg::newBlockNode;
+using ssaopt::cfg::newPlainEdge;
+using ssaopt::cfg::reportInternalFault;
+using ssaopt::cfg::requireBasicBlock;
 
 namespace {
 
@@ -94,26 +101,198 @@ node fcgNodeOf(const KvCCfgProcedure* pProcedure, ssaopt::map<node, KvCCfgProced
   return pMapped && *pMapped == pProcedure ? f : nil;
 }
 
+bool isDeadEnd(const KvCControlFlowGraph& G, node v) {
+  KvCCfgNodeInfo* pInf = G.inf(v);
+  return G.outdeg(v) == 0 && !(pInf && pInf->isExitNode());
+}
+
+// Ownership follows reachability: a node reachable from two entries ends with the later procedure
+// in name order. The distances are set back to -1 behind the search, so that every search sees the
+// whole graph unvisited while, in a consistent graph, the procedures together cost one pass over it.
+void claimReachableNodes(const KvCControlFlowGraph& G, KvCCfgProcedure* pProcedure, node_array<int>& dist) {
+  for (node x : BFS(G, pProcedure->getEntryNode(), dist)) {
+    dist[x] = -1;
+    if (KvCCfgNodeInfo* pInf = G.inf(x)) pInf->setProcedure(pProcedure);
+  }
+}
+
+// One edge per call of another procedure, parallel edges included; a call of the caller itself
+// gets none.
+void addCallEdges(const KvCControlFlowGraph& G, const KvCBasicBlock& block, ssaopt::graph& fcg,
+                  ssaopt::map<node, KvCCfgProcedure*>& procedureOf) {
+  node caller = fcgNodeOf(block.getProcedure(), procedureOf);
+  for (KvCCfgStatement* pStatement : block.getStatementSeq()) {
+    const KvCCfgProcedureCall* pCall = pStatement->isProcedureCall();
+    if (!pCall) continue;
+    node callee = fcgNodeOf(G.findProcedure(pCall->getName()), procedureOf);
+    if (!caller)
+      reportInternalFault(kLineCallerWithoutFcgNode);
+    else if (!callee)
+      reportInternalFault(kLineCalleeWithoutFcgNode);
+    else if (callee != caller)
+      fcg.new_edge(caller, callee);
+  }
+}
+
 }  // namespace
+
+// What makeProcedureAndCall does to a region: its checks, the split itself, and the repetition that
+// makes the new procedure single-entry. The reached-marks of its walks are the graph's m_Reached, all
+// false between walks, so that a walk costs the size of what it reaches, not of the whole graph.
+class KvCControlFlowGraph::RegionSplitter {
+public:
+  explicit RegionSplitter(KvCControlFlowGraph& G) : m_G(G) {}
+
+  // A procedure with its entry node, which has no edges yet.
+  static KvCCfgProcedure* newProcedure(KvCControlFlowGraph& G, const BxCXString& name) {
+    KvCCfgEntry* pEntry = new KvCCfgEntry();
+    node entry = G.new_node(pEntry);
+    KvCCfgProcedure* pProcedure = new KvCCfgProcedure();
+    pProcedure->setName(name);
+    pProcedure->setEntryNode(entry);
+    pEntry->setProcedure(pProcedure);
+    G.m_Procedures[name] = pProcedure;
+    return pProcedure;
+  }
+
+  // The region (all that `v` reaches) and everything that enters it must be blocks or entries: the
+  // single-entry repetition may split off any node of the region and put calls into any of their
+  // predecessors. An exit node in the region is refused here, as the repetition could not split it.
+  bool canBeSplitOff(node v) {
+    for (node x : reachableFrom(v)) {
+      if (!m_G.inf(x)) {
+        reportInternalFault(kLineNoPayload);
+        return false;
+      }
+      if (!requireBasicBlock(m_G, x, kLineNotABlock, kLineNotABlock) || !predecessorsCanHoldCalls(x))
+        return false;
+    }
+    return true;
+  }
+
+  // The new procedure's entry leads to `v`, every former predecessor calls it instead, and all that
+  // `v` reaches moves into it.
+  KvCCfgProcedure* splitOff(node v, const BxCXString& name) {
+    KvCCfgProcedure* pOld = m_G.inf(v)->getProcedure();
+    KvCCfgProcedure* pNew = newProcedure(m_G, name);
+    redirectPredecessorsToCalls(v, name);
+    newPlainEdge(m_G, pNew->getEntryNode(), v);
+    moveRegion(v, pOld, pNew);
+    return pNew;
+  }
+
+  // While a node reachable from the new entry is also entered from outside (a loop header of the
+  // region, typically), that node becomes a procedure of its own, and its region is made
+  // single-entry before the outer repetition goes on. The entries still to finish wait on an
+  // explicit stack rather than in nested calls, so that a deep nest of loops costs no machine stack.
+  //
+  // The repetition ends: a node split off keeps only its own entry as predecessor, so no later pass
+  // finds it again, and each pass deals with a different node of the original region. Each pass
+  // walks what the entry reaches, so a region with k such headers costs k walks.
+  void makeSingleEntry(KvCCfgProcedure* pProcedure) {
+    ssaopt::stack<node> unfinished;
+    unfinished.push(pProcedure->getEntryNode());
+    while (!unfinished.empty()) {
+      node header = nodeEnteredFromOutside(unfinished.top());
+      if (header)
+        unfinished.push(splitOffHeader(header)->getEntryNode());
+      else
+        unfinished.pop();
+    }
+  }
+
+private:
+  list<node> reachableFrom(node v) {
+    list<node> reached = DFS(m_G, v, m_G.m_Reached);
+    for (node x : reached) m_G.m_Reached[x] = false;
+    return reached;
+  }
+
+  bool predecessorsCanHoldCalls(node v) const {
+    for (edge e : m_G.in(v)) {
+      KvCCfgNodeInfo* pSource = m_G.inf(m_G.source(e));
+      if (!pSource || (!pSource->isEntryNode() && !pSource->isBasicBlock())) {
+        reportInternalFault(kLinePredecessorCannotCall);
+        return false;
+      }
+    }
+    return true;
+  }
+
+  // An entry node or a branching block cannot end in a call, so the call gets a block of its own on
+  // that edge, in the predecessor's procedure (which, inside the single-entry repetition, is not
+  // necessarily the procedure of `v`). Any other predecessor ends in the call and loses the edge.
+  void redirectPredecessorsToCalls(node v, const BxCXString& name) {
+    for (edge e : m_G.in_edges(v)) {
+      node u = m_G.source(e);
+      KvCBasicBlock* pCaller = m_G.getBasicBlock(u);
+      if (!pCaller || pCaller->getBranchCond()) {
+        node w = newBlockNode(m_G, m_G.inf(u)->getProcedure());
+        m_G.move_edge(e, u, w);
+        pCaller = m_G.getBasicBlock(w);
+      } else {
+        KvCCfgEdgeInfo* pEdgeInfo = m_G.inf(e);
+        m_G.del_edge(e);
+        delete pEdgeInfo;
+      }
+      pCaller->append(new KvCCfgProcedureCall(name));
+    }
+  }
+
+  void moveRegion(node v, KvCCfgProcedure* pOld, KvCCfgProcedure* pNew) {
+    for (node x : reachableFrom(v)) {
+      KvCCfgNodeInfo* pInf = m_G.inf(x);
+      KV_CONSISTENCY_CHECK(pInf->getProcedure() == pOld, "pInf->getProcedure() == pOldProcedure", kGraphClass,
+                           kLineRegionOfOtherProcedure);
+      pInf->setProcedure(pNew);
+    }
+  }
+
+  // The first node, in the order of first visit from `entry`, with a predecessor that `entry` does
+  // not reach; nil when there is none.
+  node nodeEnteredFromOutside(node entry) {
+    ssaopt::node_array<bool>& reachedMarks = m_G.m_Reached;
+    list<node> reached = DFS(m_G, entry, reachedMarks);
+    auto enteredFromOutside = [this, &reachedMarks](node x) {
+      for (edge e : m_G.in(x))
+        if (!reachedMarks[m_G.source(e)]) return true;
+      return false;
+    };
+    auto found = std::find_if(reached.begin(), reached.end(), enteredFromOutside);
+    node header = found == reached.end() ? nil : *found;
+    for (node x : reached) reachedMarks[x] = false;
+    return header;
+  }
+
+  // A header is named after its own block, never after an entry node in front of it: that name
+  // would be the entry's procedure, the split would change nothing and the next pass would find the
+  // header again. The entry node, like a branching block, then gets a new block of its own
+  // procedure where the call stands. A header whose own name is taken (it was made a procedure
+  // before, and an edge into it was added since) is entered through a new empty block instead,
+  // whose index gives a fresh name.
+  KvCCfgProcedure* splitOffHeader(node header) {
+    node first = header;
+    while (m_G.findProcedure(nameOfProcedureStartingWith(*m_G.getBasicBlock(first))))
+      first = insertEmptyBlockBefore(first);
+    return splitOff(first, nameOfProcedureStartingWith(*m_G.getBasicBlock(first)));
+  }
+
+  node insertEmptyBlockBefore(node v) {
+    node w = newBlockNode(m_G, m_G.inf(v)->getProcedure());
+    while (edge e = m_G.first_in_edge(v)) m_G.move_edge(e, m_G.source(e), w);
+    newPlainEdge(m_G, w, v);
+    return w;
+  }
+
+  KvCControlFlowGraph& m_G;
+};
 
 // ---- The procedure table -------------------------------------------------------------------------
 
 node KvCControlFlowGraph::demandProcedureEntryNode(const BxCXString& name, KvCCfgProcedure*& pProcedure) {
   pProcedure = findProcedure(name);
-  if (!pProcedure) pProcedure = newProcedure(name);
+  if (!pProcedure) pProcedure = RegionSplitter::newProcedure(*this, name);
   return pProcedure->getEntryNode();
-}
-
-// A procedure with its entry node, which has no edges yet.
-KvCCfgProcedure* KvCControlFlowGraph::newProcedure(const BxCXString& name) {
-  KvCCfgEntry* pEntry = new KvCCfgEntry();
-  node entry = new_node(pEntry);
-  KvCCfgProcedure* pProcedure = new KvCCfgProcedure();
-  pProcedure->setName(name);
-  pProcedure->setEntryNode(entry);
-  pEntry->setProcedure(pProcedure);
-  m_Procedures[name] = pProcedure;
-  return pProcedure;
 }
 
 // ---- Regions become procedures -------------------------------------------------------------------
@@ -122,143 +301,18 @@ KvCCfgProcedure* KvCControlFlowGraph::newProcedure(const BxCXString& name) {
 // procedure and changes nothing. Everything else is checked before the first change, so that a
 // refusal leaves the graph as it was.
 KvCCfgProcedureCall* KvCControlFlowGraph::makeProcedureAndCall(node v) {
-  const KvCBasicBlock* pBlock = requireBasicBlock(v, kLineNotABlock, kLineNotABlock);
+  const KvCBasicBlock* pBlock = requireBasicBlock(*this, v, kLineNotABlock, kLineNotABlock);
   if (!pBlock) return nullptr;
   BxCXString name = procedureNameFor(*this, v, *pBlock);
   if (const KvCCfgProcedure* pExisting = findProcedure(name)) {
-    if (firstBlockOf(*pExisting) == v) return new KvCCfgProcedureCall(name);
+    if (firstBlockOf(*this, *pExisting) == v) return new KvCCfgProcedureCall(name);
     reportInternalFault(kLineNameTaken);
     return nullptr;
   }
-  if (!canBeSplitOff(v)) return nullptr;
-  makeSingleEntry(splitOff(v, name));
+  RegionSplitter splitter(*this);
+  if (!splitter.canBeSplitOff(v)) return nullptr;
+  splitter.makeSingleEntry(splitter.splitOff(v, name));
   return new KvCCfgProcedureCall(name);
-}
-
-list<node> KvCControlFlowGraph::reachableFrom(node v) {
-  list<node> reached = DFS(*this, v, m_Reached);
-  for (node x : reached) m_Reached[x] = false;
-  return reached;
-}
-
-// The region (all that `v` reaches) and everything that enters it must be blocks or entries: the
-// single-entry repetition may split off any node of the region and put calls into any of their
-// predecessors. An exit node in the region is refused here, as the repetition could not split it.
-bool KvCControlFlowGraph::canBeSplitOff(node v) {
-  for (node x : reachableFrom(v)) {
-    if (!inf(x)) {
-      reportInternalFault(kLineNoPayload);
-      return false;
-    }
-    if (!requireBasicBlock(x, kLineNotABlock, kLineNotABlock) || !predecessorsCanHoldCalls(x)) return false;
-  }
-  return true;
-}
-
-bool KvCControlFlowGraph::predecessorsCanHoldCalls(node v) const {
-  for (edge e : in(v)) {
-    KvCCfgNodeInfo* pSource = inf(source(e));
-    if (!pSource || (!pSource->isEntryNode() && !pSource->isBasicBlock())) {
-      reportInternalFault(kLinePredecessorCannotCall);
-      return false;
-    }
-  }
-  return true;
-}
-
-// The new procedure's entry leads to `v`, every former predecessor calls it instead, and all that
-// `v` reaches moves into it.
-KvCCfgProcedure* KvCControlFlowGraph::splitOff(node v, const BxCXString& name) {
-  KvCCfgProcedure* pOld = inf(v)->getProcedure();
-  KvCCfgProcedure* pNew = newProcedure(name);
-  redirectPredecessorsToCalls(v, name);
-  newPlainEdge(pNew->getEntryNode(), v);
-  moveRegion(v, pOld, pNew);
-  return pNew;
-}
-
-// An entry node or a branching block cannot end in a call, so the call gets a block of its own on
-// that edge, in the predecessor's procedure (which, inside the single-entry repetition, is not
-// necessarily the procedure of `v`). Any other predecessor ends in the call and loses the edge.
-void KvCControlFlowGraph::redirectPredecessorsToCalls(node v, const BxCXString& name) {
-  for (edge e : in_edges(v)) {
-    node u = source(e);
-    KvCBasicBlock* pCaller = getBasicBlock(u);
-    if (!pCaller || pCaller->getBranchCond()) {
-      node w = newBlockNode(inf(u)->getProcedure());
-      move_edge(e, u, w);
-      pCaller = getBasicBlock(w);
-    } else {
-      KvCCfgEdgeInfo* pEdgeInfo = inf(e);
-      del_edge(e);
-      delete pEdgeInfo;
-    }
-    pCaller->append(new KvCCfgProcedureCall(name));
-  }
-}
-
-void KvCControlFlowGraph::moveRegion(node v, KvCCfgProcedure* pOld, KvCCfgProcedure* pNew) {
-  for (node x : reachableFrom(v)) {
-    KvCCfgNodeInfo* pInf = inf(x);
-    KV_CONSISTENCY_CHECK(pInf->getProcedure() == pOld, "pInf->getProcedure() == pOldProcedure", kClassName,
-                         kLineRegionOfOtherProcedure);
-    pInf->setProcedure(pNew);
-  }
-}
-
-// While a node reachable from the new entry is also entered from outside (a loop header of the
-// region, typically), that node becomes a procedure of its own, and its region is made single-entry
-// before the outer repetition goes on. The entries still to finish wait on an explicit stack rather
-// than in nested calls, so that a deep nest of loops costs no machine stack.
-//
-// The repetition ends: a node split off keeps only its own entry as predecessor, so no later pass
-// finds it again, and each pass deals with a different node of the original region. Each pass walks
-// what the entry reaches, so a region with k such headers costs k walks.
-void KvCControlFlowGraph::makeSingleEntry(KvCCfgProcedure* pProcedure) {
-  ssaopt::stack<node> unfinished;
-  unfinished.push(pProcedure->getEntryNode());
-  while (!unfinished.empty()) {
-    node header = nodeEnteredFromOutside(unfinished.top());
-    if (header)
-      unfinished.push(splitOffHeader(header)->getEntryNode());
-    else
-      unfinished.pop();
-  }
-}
-
-// The first node, in the order of first visit from `entry`, with a predecessor that `entry` does not
-// reach; nil when there is none.
-node KvCControlFlowGraph::nodeEnteredFromOutside(node entry) {
-  list<node> reached = DFS(*this, entry, m_Reached);
-  auto enteredFromOutside = [this](node x) {
-    for (edge e : in(x))
-      if (!m_Reached[source(e)]) return true;
-    return false;
-  };
-  auto found = std::find_if(reached.begin(), reached.end(), enteredFromOutside);
-  node header = found == reached.end() ? nil : *found;
-  for (node x : reached) m_Reached[x] = false;
-  return header;
-}
-
-// A header is named after its own block, never after an entry node in front of it: that name would
-// be the entry's procedure, the split would change nothing and the next pass would find the header
-// again. The entry node, like a branching block, then gets a new block of its own procedure where
-// the call stands. A header whose own name is taken (it was made a procedure before, and an edge
-// into it was added since) is entered through a new empty block instead, whose index gives a fresh
-// name.
-KvCCfgProcedure* KvCControlFlowGraph::splitOffHeader(node header) {
-  node first = header;
-  while (findProcedure(nameOfProcedureStartingWith(*getBasicBlock(first))))
-    first = insertEmptyBlockBefore(first);
-  return splitOff(first, nameOfProcedureStartingWith(*getBasicBlock(first)));
-}
-
-node KvCControlFlowGraph::insertEmptyBlockBefore(node v) {
-  node w = newBlockNode(inf(v)->getProcedure());
-  while (edge e = first_in_edge(v)) move_edge(e, source(e), w);
-  newPlainEdge(w, v);
-  return w;
 }
 
 // ---- Call arguments ------------------------------------------------------------------------------
@@ -292,7 +346,7 @@ void KvCControlFlowGraph::placeExitNodes() {
   ssaopt::array<node> exitOf(static_cast<std::size_t>(count));
   for (node& exit : exitOf) exit = new_node(new KvCCfgExit());
   for (node v : nodes())
-    if (isDeadEnd(v)) newPlainEdge(v, exitOf[static_cast<std::size_t>(component[v])]);
+    if (isDeadEnd(*this, v)) newPlainEdge(*this, v, exitOf[static_cast<std::size_t>(component[v])]);
   for (const auto& named : m_Procedures) {
     KvCCfgProcedure* pProcedure = named.second;
     node exit = exitOf[static_cast<std::size_t>(component[pProcedure->getEntryNode()])];
@@ -301,23 +355,18 @@ void KvCControlFlowGraph::placeExitNodes() {
   }
 }
 
-bool KvCControlFlowGraph::isDeadEnd(node v) const {
-  KvCCfgNodeInfo* pInf = inf(v);
-  return outdeg(v) == 0 && !(pInf && pInf->isExitNode());
-}
-
 // Every path that ends "#main" passes a block with an undetermined condition that starts the body
 // again or leaves. A body that never reaches its exit gets no such block, as nothing would enter it;
 // without "#main", its first block or its exit node there is nothing to close.
 void KvCControlFlowGraph::placeLoopAroundMain() {
   KvCCfgProcedure* pMain = findProcedure(kMainProcedureName);
   if (!pMain) return;
-  KV_CONSISTENCY_CHECK(outdeg(pMain->getEntryNode()) == 1, "outdeg(EntryNode) == 1", kClassName,
+  KV_CONSISTENCY_CHECK(outdeg(pMain->getEntryNode()) == 1, "outdeg(EntryNode) == 1", kGraphClass,
                        kLineMainEntryOutdeg);
-  node first = firstBlockOf(*pMain);
+  node first = firstBlockOf(*this, *pMain);
   node exit = pMain->getExitNode();
   if (!first || !exit || indeg(exit) == 0) return;
-  node loop = newBlockNode(pMain);
+  node loop = newBlockNode(*this, pMain);
   getBasicBlock(loop)->appendBranch(new KvCCfgValueExpression());
   while (edge e = first_in_edge(exit)) move_edge(e, source(e), loop);
   new_edge(loop, first, new KvCCfgTrueBranch());
@@ -336,36 +385,8 @@ void KvCControlFlowGraph::buildFunctionCallGraph(ssaopt::graph& fcg,
     node f = fcg.new_node();
     pProcedure->setFcgNode(f);
     procedureOf[f] = pProcedure;
-    claimReachableNodes(pProcedure, dist);
+    claimReachableNodes(*this, pProcedure, dist);
   }
   for (node v : nodes())
-    if (const KvCBasicBlock* pBlock = getBasicBlock(v)) addCallEdges(*pBlock, fcg, procedureOf);
-}
-
-// Ownership follows reachability: a node reachable from two entries ends with the later procedure
-// in name order. The distances are set back to -1 behind the search, so that every search sees the
-// whole graph unvisited while, in a consistent graph, the procedures together cost one pass over it.
-void KvCControlFlowGraph::claimReachableNodes(KvCCfgProcedure* pProcedure, node_array<int>& dist) {
-  for (node x : BFS(*this, pProcedure->getEntryNode(), dist)) {
-    dist[x] = -1;
-    if (KvCCfgNodeInfo* pInf = inf(x)) pInf->setProcedure(pProcedure);
-  }
-}
-
-// One edge per call of another procedure, parallel edges included; a call of the caller itself
-// gets none.
-void KvCControlFlowGraph::addCallEdges(const KvCBasicBlock& block, ssaopt::graph& fcg,
-                                       ssaopt::map<node, KvCCfgProcedure*>& procedureOf) const {
-  node caller = fcgNodeOf(block.getProcedure(), procedureOf);
-  for (KvCCfgStatement* pStatement : block.getStatementSeq()) {
-    const KvCCfgProcedureCall* pCall = pStatement->isProcedureCall();
-    if (!pCall) continue;
-    node callee = fcgNodeOf(findProcedure(pCall->getName()), procedureOf);
-    if (!caller)
-      reportInternalFault(kLineCallerWithoutFcgNode);
-    else if (!callee)
-      reportInternalFault(kLineCalleeWithoutFcgNode);
-    else if (callee != caller)
-      fcg.new_edge(caller, callee);
-  }
+    if (const KvCBasicBlock* pBlock = getBasicBlock(v)) addCallEdges(*this, *pBlock, fcg, procedureOf);
 }

@@ -9,6 +9,7 @@
 // it calls.
 #include <cstddef>
 
+#include "graph_mechanism.h"
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/frame/report.h"
 #include "ssaopt/ir/dominator_tree.h"
@@ -23,6 +24,8 @@ using ssaopt::list;
 using ssaopt::nil;
 using ssaopt::node;
 using ssaopt::node_array;
+using ssaopt::cfg::kGraphClass;
+using ssaopt::cfg::newPlainEdge;
 
 namespace {
 
@@ -52,6 +55,36 @@ constexpr RenamingFault kNoVersionForBranchCondition{2028, true};
 constexpr RenamingFault kNoVersionForPhiOperand{2062, true};
 constexpr RenamingFault kNoVersionForValueReturn{2087, false};
 
+// The exit payload moves on to a new node behind y and stays the procedure's exit; y keeps its
+// in-edges, on which the phi operands depend, and its place in the dominator tree. The new block
+// takes over y's dominator information; the new exit node is dominated by y alone and has an empty
+// frontier.
+KvCBasicBlock* turnExitIntoBlock(KvCControlFlowGraph& G, node y) {
+  KvCCfgExit* pExit = G.inf(y)->isExitNode();
+  node exit = G.new_node(pExit);
+  newPlainEdge(G, y, exit);
+  KvCBasicBlock* pBlock = new KvCBasicBlock();
+  pBlock->setIdom(pExit->getIdom());
+  if (const ssaopt::set<node>* pFrontier = pExit->frontierIfAny()) *pBlock->getDF() = *pFrontier;
+  G.assign(y, pBlock);
+  pExit->setIdom(y);
+  pExit->clearDF();
+  KvCCfgProcedure* pProcedure = pExit->getProcedure();
+  KV_CONSISTENCY_CHECK(pProcedure, "pProcedure", kGraphClass, kLineExitWithoutProcedure);
+  pBlock->setProcedure(pProcedure);
+  if (pProcedure) pProcedure->setExitNode(exit);
+  return pBlock;
+}
+
+// An exit node becomes a block the first time it needs a phi function; any other node of a frontier
+// must be a block already (null otherwise, and the phi function is not placed).
+KvCBasicBlock* blockForPhiFunctions(KvCControlFlowGraph& G, node y) {
+  KvCCfgNodeInfo* pInf = G.inf(y);
+  if (!pInf) return nullptr;
+  if (pInf->isExitNode()) return turnExitIntoBlock(G, y);
+  return pInf->isBasicBlock();
+}
+
 }  // namespace
 
 // ---- The driver ----------------------------------------------------------------------------------
@@ -62,16 +95,16 @@ void KvCControlFlowGraph::transformToSSAForm() {
   array<KvCDominatorTree*> trees;
   collectVarDefsAndUses();
   initVariablesAfterEntryNodes();
-  KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kClassName, kLineCheckAfterEntryBlocks);
+  KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kGraphClass, kLineCheckAfterEntryBlocks);
   placeValueReturnStatements();
-  KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kClassName, kLineCheckAfterValueReturns);
+  KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kGraphClass, kLineCheckAfterValueReturns);
   placeOutputStatements();
-  KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kClassName, kLineCheckAfterOutputs);
+  KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kGraphClass, kLineCheckAfterOutputs);
   computeAllIdoms();
   int count = buildDominatorTrees(trees);
   computeDominanceFrontiers(trees);
   placePhiFunction();
-  KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kClassName, kLineCheckAfterPhiFunctions);
+  KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kGraphClass, kLineCheckAfterPhiFunctions);
   renameVariables(trees);
   freeDominatorTrees(trees, count);
 }
@@ -117,7 +150,7 @@ void KvCControlFlowGraph::placePhiFunction() {
       if (!pFrontier) continue;
       for (node y : *pFrontier) {
         if (hasAlready[y] >= iteration) continue;
-        if (KvCBasicBlock* pBlock = blockForPhiFunctions(y))
+        if (KvCBasicBlock* pBlock = blockForPhiFunctions(*this, y))
           pBlock->append(new KvCPhiFunction(pVariable, indeg(y)));
         hasAlready[y] = iteration;
         if (work[y] < iteration) {
@@ -127,36 +160,6 @@ void KvCControlFlowGraph::placePhiFunction() {
       }
     }
   }
-}
-
-// An exit node becomes a block the first time it needs a phi function; any other node of a frontier
-// must be a block already (null otherwise, and the phi function is not placed).
-KvCBasicBlock* KvCControlFlowGraph::blockForPhiFunctions(node y) {
-  KvCCfgNodeInfo* pInf = inf(y);
-  if (!pInf) return nullptr;
-  if (pInf->isExitNode()) return turnExitIntoBlock(y);
-  return pInf->isBasicBlock();
-}
-
-// The exit payload moves on to a new node behind y and stays the procedure's exit; y keeps its
-// in-edges, on which the phi operands depend, and its place in the dominator tree. The new block
-// takes over y's dominator information; the new exit node is dominated by y alone and has an empty
-// frontier.
-KvCBasicBlock* KvCControlFlowGraph::turnExitIntoBlock(node y) {
-  KvCCfgExit* pExit = inf(y)->isExitNode();
-  node exit = new_node(pExit);
-  newPlainEdge(y, exit);
-  KvCBasicBlock* pBlock = new KvCBasicBlock();
-  pBlock->setIdom(pExit->getIdom());
-  if (const ssaopt::set<node>* pFrontier = pExit->frontierIfAny()) *pBlock->getDF() = *pFrontier;
-  assign(y, pBlock);
-  pExit->setIdom(y);
-  pExit->clearDF();
-  KvCCfgProcedure* pProcedure = pExit->getProcedure();
-  KV_CONSISTENCY_CHECK(pProcedure, "pProcedure", kClassName, kLineExitWithoutProcedure);
-  pBlock->setProcedure(pProcedure);
-  if (pProcedure) pProcedure->setExitNode(exit);
-  return pBlock;
 }
 
 // ---- Renaming ------------------------------------------------------------------------------------
@@ -347,8 +350,8 @@ private:
   }
 
   static void report(RenamingFault fault) {
-    KV_CONSISTENCY_CHECK(false, "0", kClassName, fault.line);
-    if (fault.internalError) ssaopt::reportInternalError(kClassName, fault.line);
+    KV_CONSISTENCY_CHECK(false, "0", kGraphClass, fault.line);
+    if (fault.internalError) ssaopt::reportInternalError(kGraphClass, fault.line);
   }
 
   KvCControlFlowGraph& m_G;

@@ -10,6 +10,7 @@
 // Needs the values of sparse conditional constant propagation, and for the removal divided blocks.
 // What replacing and folding mean is the expressions' business; this file only decides which
 // expressions are asked, and in which order.
+#include "graph_mechanism.h"
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/frame/report.h"
 #include "ssaopt/ir/expression.h"
@@ -18,6 +19,8 @@
 #include "variable_table.h"
 
 using ssaopt::node;
+using ssaopt::cfg::kGraphClass;
+using ssaopt::cfg::reportInternalFault;
 
 namespace {
 
@@ -100,7 +103,7 @@ private:
     KvCCfgStatement* pStatement = pBlock ? onlyDefinitionOf(*pBlock) : nullptr;
     if (!pStatement) return;
     ssaopt::set<KvCCfgVariable*> defined = pStatement->getDefinedVariables();
-    KV_CONSISTENCY_CHECK(defined.size() <= 1, "DefinedVariables.size() <= 1", kClassName,
+    KV_CONSISTENCY_CHECK(defined.size() <= 1, "DefinedVariables.size() <= 1", kGraphClass,
                          kLineRemoveUnusedDefinesSeveral);
     if (defined.size() != 1) return;
     KvCCfgVariable& variable = **defined.begin();

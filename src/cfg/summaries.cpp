@@ -11,6 +11,7 @@
 #include <cstddef>
 #include <iterator>
 
+#include "graph_mechanism.h"
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/frame/graph_algorithms.h"
 #include "ssaopt/frame/report.h"
@@ -26,6 +27,10 @@ using ssaopt::list;
 using ssaopt::nil;
 using ssaopt::node;
 using ssaopt::node_array;
+using ssaopt::cfg::kGraphClass;
+using ssaopt::cfg::newBlockNode;
+using ssaopt::cfg::newPlainEdge;
+using ssaopt::cfg::reportInternalFault;
 using Variables = ssaopt::set<KvCCfgVariable*>;
 
 namespace {
@@ -147,6 +152,51 @@ private:
   array<ssaopt::set<node>> m_Members;
 };
 
+void addUses(KvCCfgProcedure& procedure, const Variables& variables) {
+  for (KvCCfgVariable* pVariable : variables) procedure.appendUsedVariable(pVariable);
+}
+
+// The call reads what its arguments read; what the callee defines reaches the caller through the
+// call graph. A call of a name that is not in the table reads nothing.
+void addArgumentUses(const KvCControlFlowGraph& G, KvCCfgProcedure& caller, KvCCfgProcedureCall* pCall) {
+  const KvCCfgProcedure* pCallee = G.findProcedure(pCall->getName());
+  if (!pCallee) return;
+  for (const KvCCfgParamStatement* pParam : pCallee->getParamStatements())
+    addUses(caller, passedVariables(*pParam, pCall));
+}
+
+void addDefsAndUsesOfBlock(const KvCControlFlowGraph& G, const KvCBasicBlock& block,
+                           KvCCfgProcedure& procedure) {
+  for (KvCCfgStatement* pStatement : block.getStatementSeq()) {
+    if (KvCCfgAssignment* pAssignment = pStatement->isAssignment()) {
+      if (const KvCCfgExpression* pRHS = pAssignment->getRHS()) addUses(procedure, pRHS->getUsedVariables());
+      if (KvCCfgVariable* pLHS = pAssignment->getLHS()) procedure.appendDefinedVariable(pLHS);
+    } else if (KvCCfgExternCall* pExternCall = pStatement->isExternCall()) {
+      addUses(procedure, pExternCall->getUsedVariables());
+    } else if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall()) {
+      addArgumentUses(G, procedure, pCall);
+    } else {
+      KV_CONSISTENCY_CHECK(false, "0", kGraphClass, kLineUnknownStatementInSummary);
+    }
+  }
+  if (const KvCCfgExpression* pCond = block.getBranchCond()) addUses(procedure, pCond->getUsedVariables());
+}
+
+// Every call writes the formals that it passes before the callee runs, whether or not the callee's
+// body assigns them: a caller that reads a formal after the call must see that write.
+void addFormalsToDefinedVariables(const KvCControlFlowGraph& G) {
+  for (const auto& named : G.getProcedures())
+    for (const KvCCfgParamStatement* pParam : named.second->getParamStatements())
+      named.second->appendDefinedVariable(pParam->getVariable());
+}
+
+// A call that passed fewer formals than the first, or that was placed without arguments, passes the
+// formal's own value at the call, so that every call has an argument for renaming to update.
+void passFormalWhereArgumentMissing(KvCCfgParamStatement& param, const list<KvCCfgProcedureCall*>& calls) {
+  for (KvCCfgProcedureCall* pCall : calls)
+    if (!param.getArgument(pCall)) param.setArgument(pCall, expressionOf(param.getVariable()));
+}
+
 }  // namespace
 
 // ---- Def/use summaries ---------------------------------------------------------------------------
@@ -162,48 +212,10 @@ void KvCControlFlowGraph::collectVarDefsAndUses() {
   for (node v : nodes()) {
     KvCCfgProcedure* pProcedure = owner[static_cast<std::size_t>(component[v])];
     const KvCBasicBlock* pBlock = getBasicBlock(v);
-    if (pProcedure && pBlock) addDefsAndUsesOfBlock(*pBlock, *pProcedure);
+    if (pProcedure && pBlock) addDefsAndUsesOfBlock(*this, *pBlock, *pProcedure);
   }
-  addFormalsToDefinedVariables();
+  addFormalsToDefinedVariables(*this);
   addVarDefsAndUsesOfCalledProcs();
-}
-
-void KvCControlFlowGraph::addDefsAndUsesOfBlock(const KvCBasicBlock& block,
-                                                KvCCfgProcedure& procedure) const {
-  for (KvCCfgStatement* pStatement : block.getStatementSeq()) {
-    if (KvCCfgAssignment* pAssignment = pStatement->isAssignment()) {
-      if (const KvCCfgExpression* pRHS = pAssignment->getRHS()) addUses(procedure, pRHS->getUsedVariables());
-      if (KvCCfgVariable* pLHS = pAssignment->getLHS()) procedure.appendDefinedVariable(pLHS);
-    } else if (KvCCfgExternCall* pExternCall = pStatement->isExternCall()) {
-      addUses(procedure, pExternCall->getUsedVariables());
-    } else if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall()) {
-      addArgumentUses(procedure, pCall);
-    } else {
-      KV_CONSISTENCY_CHECK(false, "0", kClassName, kLineUnknownStatementInSummary);
-    }
-  }
-  if (const KvCCfgExpression* pCond = block.getBranchCond()) addUses(procedure, pCond->getUsedVariables());
-}
-
-// The call reads what its arguments read; what the callee defines reaches the caller through the
-// call graph. A call of a name that is not in the table reads nothing.
-void KvCControlFlowGraph::addArgumentUses(KvCCfgProcedure& caller, KvCCfgProcedureCall* pCall) const {
-  const KvCCfgProcedure* pCallee = findProcedure(pCall->getName());
-  if (!pCallee) return;
-  for (const KvCCfgParamStatement* pParam : pCallee->getParamStatements())
-    addUses(caller, passedVariables(*pParam, pCall));
-}
-
-void KvCControlFlowGraph::addUses(KvCCfgProcedure& procedure, const Variables& variables) {
-  for (KvCCfgVariable* pVariable : variables) procedure.appendUsedVariable(pVariable);
-}
-
-// Every call writes the formals that it passes before the callee runs, whether or not the callee's
-// body assigns them: a caller that reads a formal after the call must see that write.
-void KvCControlFlowGraph::addFormalsToDefinedVariables() {
-  for (const auto& named : m_Procedures)
-    for (const KvCCfgParamStatement* pParam : named.second->getParamStatements())
-      named.second->appendDefinedVariable(pParam->getVariable());
 }
 
 void KvCControlFlowGraph::addVarDefsAndUsesOfCalledProcs() {
@@ -229,9 +241,9 @@ void KvCControlFlowGraph::initVariablesAfterEntryNodes() {
     KvCCfgProcedure* pProcedure = named.second;
     node entry = pProcedure->getEntryNode();
     if (!entry) continue;
-    node first = newBlockNode(pProcedure);
+    node first = newBlockNode(*this, pProcedure);
     for (edge e : out_edges(entry)) move_edge(e, first, target(e));
-    newPlainEdge(entry, first);
+    newPlainEdge(*this, entry, first);
     Variables variables = pProcedure->getDefinedVariables();
     ssaopt::insertAll(variables, pProcedure->getUsedVariables());
     if (entry == getStartNode())
@@ -243,7 +255,7 @@ void KvCControlFlowGraph::initVariablesAfterEntryNodes() {
 
 void KvCControlFlowGraph::addVarInits(node v, Variables variables) {
   KvCBasicBlock* pBlock = getBasicBlock(v);
-  KV_CONSISTENCY_CHECK(pBlock, "pBasicBlock", kClassName, kLineInitBlockNotABlock);
+  KV_CONSISTENCY_CHECK(pBlock, "pBasicBlock", kGraphClass, kLineInitBlockNotABlock);
   if (!pBlock) return;
   for (KvCCfgVariable* pVariable : variables) {
     KvCCfgInitAssignment* pInit = new KvCCfgInitAssignment();
@@ -257,7 +269,7 @@ void KvCControlFlowGraph::addVarInits(node v, Variables variables) {
 // for every other variable of the summary, each call passing the variable itself.
 void KvCControlFlowGraph::addParamStatements(node v, Variables variables, KvCCfgProcedure* pProcedure) {
   KvCBasicBlock* pBlock = getBasicBlock(v);
-  KV_CONSISTENCY_CHECK(pBlock, "pBasicBlock", kClassName, kLineParamBlockNotABlock);
+  KV_CONSISTENCY_CHECK(pBlock, "pBasicBlock", kGraphClass, kLineParamBlockNotABlock);
   if (!pBlock) return;
   list<KvCCfgProcedureCall*> calls = pProcedure->getCalls();
   for (KvCCfgParamStatement* pParam : pProcedure->getParamStatements()) {
@@ -273,44 +285,38 @@ void KvCControlFlowGraph::addParamStatements(node v, Variables variables, KvCCfg
   }
 }
 
-// A call that passed fewer formals than the first, or that was placed without arguments, passes the
-// formal's own value at the call, so that every call has an argument for renaming to update.
-void KvCControlFlowGraph::passFormalWhereArgumentMissing(KvCCfgParamStatement& param,
-                                                         const list<KvCCfgProcedureCall*>& calls) {
-  for (KvCCfgProcedureCall* pCall : calls)
-    if (!param.getArgument(pCall)) param.setArgument(pCall, expressionOf(param.getVariable()));
-}
-
 // Nodes split off behind a call are met by the inner loop, not by the walk over the nodes that were
 // there at the start. A node without payload is reported and passed by.
+//
+// The values a call brings back must be there before the next statement reads them, so the group of
+// a call that does not end its block is placed right after it: the statements behind the call move
+// into a new block, whose calls are handled next. A call that ends its block, or whose callee defines
+// nothing, changes no block's shape.
 void KvCControlFlowGraph::placeValueReturnStatements() {
+  // Places the group of the first call of `v` that brings values back; the node holding the
+  // statements behind it, or nil when none is left.
+  auto placeAfterFirstCall = [this](node v) -> node {
+    KvCBasicBlock* pBlock = getBasicBlock(v);
+    if (!pBlock) return nil;
+    const list<KvCCfgStatement*>& statements = pBlock->getStatementSeq();
+    for (auto it = statements.begin(); it != statements.end(); ++it) {
+      KvCCfgProcedureCall* pCall = (*it)->isProcedureCall();
+      KvCCfgProcedure* pCallee = pCall ? findProcedure(pCall->getName()) : nullptr;
+      if (!pCallee || pCallee->getDefinedVariables().empty()) continue;
+      auto next = std::next(it);
+      node rest = next == statements.end() ? nil : splitAtStatement(v, *next);
+      addValueReturnStatements(pBlock, pCallee->getDefinedVariables(), pCallee);
+      return rest;
+    }
+    return nil;
+  };
   for (node v : all_nodes()) {
     if (!inf(v)) {
       reportInternalFault(kLineNodeWithoutPayload);
       continue;
     }
-    for (node rest = v; rest;) rest = placeValueReturnStatementsAfterCalls(rest);
+    for (node rest = v; rest;) rest = placeAfterFirstCall(rest);
   }
-}
-
-// The values a call brings back must be there before the next statement reads them, so the group of
-// a call that does not end its block is placed right after it: the statements behind the call move
-// into a new block, whose node this returns so that its calls are handled next (nil when none is
-// left). A call that ends its block, or whose callee defines nothing, changes no block's shape.
-node KvCControlFlowGraph::placeValueReturnStatementsAfterCalls(node v) {
-  KvCBasicBlock* pBlock = getBasicBlock(v);
-  if (!pBlock) return nil;
-  const list<KvCCfgStatement*>& statements = pBlock->getStatementSeq();
-  for (auto it = statements.begin(); it != statements.end(); ++it) {
-    KvCCfgProcedureCall* pCall = (*it)->isProcedureCall();
-    KvCCfgProcedure* pCallee = pCall ? findProcedure(pCall->getName()) : nullptr;
-    if (!pCallee || pCallee->getDefinedVariables().empty()) continue;
-    auto next = std::next(it);
-    node rest = next == statements.end() ? nil : splitAtStatement(v, *next);
-    addValueReturnStatements(pBlock, pCallee->getDefinedVariables(), pCallee);
-    return rest;
-  }
-  return nil;
 }
 
 void KvCControlFlowGraph::addValueReturnStatements(KvCBasicBlock* pBlock, Variables variables,
@@ -328,9 +334,9 @@ void KvCControlFlowGraph::placeOutputStatements() {
   KvCCfgProcedure* pMain = findProcedure(kMainProcedureName);
   node exit = pMain ? pMain->getExitNode() : nil;
   if (!exit) return;
-  node last = newBlockNode(pMain);
+  node last = newBlockNode(*this, pMain);
   while (edge e = first_in_edge(exit)) move_edge(e, source(e), last);
-  newPlainEdge(last, exit);
+  newPlainEdge(*this, last, exit);
   Variables outputs;
   for (const Variables& variables : {pMain->getDefinedVariables(), pMain->getUsedVariables()})
     for (KvCCfgVariable* pVariable : variables)

@@ -7,6 +7,7 @@
 //            B [if (b)] -T-> [b := 1 (virtual)] -> C,  B -F-> [b := 0 (virtual)] -> D
 //
 // Needs: the graph before SSA form; renaming turns the virtual assignments into virtual aliases.
+#include "graph_mechanism.h"
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/frame/report.h"
 #include "ssaopt/frame/types.h"
@@ -18,6 +19,9 @@
 using ssaopt::edge;
 using ssaopt::nil;
 using ssaopt::node;
+using ssaopt::cfg::newBlockNode;
+using ssaopt::cfg::newPlainEdge;
+using ssaopt::cfg::reportInternalFault;
 
 namespace {
 
@@ -84,6 +88,22 @@ void assignComparedVariable(KvCCfgExpression& cond, KvCCfgVariable* x, const KvC
   (inequality ? falseAssign : trueAssign) = newVirtualAssignment(x, c);
 }
 
+// v -e-> t becomes v -e-> w [assignment] -> t; `e` keeps its payload, and t's in-edge from v is
+// replaced by one from w.
+void placeOnBranch(KvCControlFlowGraph& G, edge e, KvCCfgAssignment* pAssign) {
+  if (!pAssign) return;
+  if (!e) {
+    reportInternalFault(kLineMissingBranchEdge);
+    discard(pAssign);
+    return;
+  }
+  node v = G.source(e);
+  node w = newBlockNode(G, G.inf(v)->getProcedure());
+  G.getBasicBlock(w)->append(pAssign);
+  newPlainEdge(G, w, G.target(e));
+  G.move_edge(e, v, w);
+}
+
 }  // namespace
 
 // New blocks are placed behind the nodes of the snapshot, so a second run meets only the branches it
@@ -108,8 +128,8 @@ void KvCControlFlowGraph::insertValidConditionAssignments() {
       if (!pEdgeInfo->isFalseBranch()) reportInternalFault(kLineNeitherTrueNorFalseBranch);
       onFalse = e;
     }
-    placeOnBranch(onTrue, trueAssign);
-    placeOnBranch(onFalse, falseAssign);
+    placeOnBranch(*this, onTrue, trueAssign);
+    placeOnBranch(*this, onFalse, falseAssign);
   }
 }
 
@@ -129,20 +149,4 @@ void KvCControlFlowGraph::createValidConditionAssignments(KvCCfgExpression*& pCo
   bool inequality = false;
   if (pCond->isVariableEqualToConstant(x, c, inequality) && x)
     assignComparedVariable(*pCond, x, c, inequality, trueAssign, falseAssign);
-}
-
-// v -e-> t becomes v -e-> w [assignment] -> t; `e` keeps its payload, and t's in-edge from v is
-// replaced by one from w.
-void KvCControlFlowGraph::placeOnBranch(edge e, KvCCfgAssignment* pAssign) {
-  if (!pAssign) return;
-  if (!e) {
-    reportInternalFault(kLineMissingBranchEdge);
-    discard(pAssign);
-    return;
-  }
-  node v = source(e);
-  node w = newBlockNode(inf(v)->getProcedure());
-  getBasicBlock(w)->append(pAssign);
-  newPlainEdge(w, target(e));
-  move_edge(e, v, w);
 }

@@ -159,38 +159,20 @@ public:
   void hoistCodeOutOfIfElseBranches();
 
 private:
+  // The specification's private operations stay members; each step's own helpers are functions of
+  // its source file (src/cfg/), and what a step keeps while it runs is a class of its own, declared
+  // here for its access to the graph and defined in the step's source.
   friend class KvCControlFlowGraphTestAccess;
+  friend class KvCControlFlowGraphSSATestAccess;
 
-  // Class name and file of the internal error and consistency reports.
-  static constexpr const char* kClassName = "KvCControlFlowGraph";
+  // ---- Mechanism that several steps share (graph.cpp) -------------------------------------------
 
-  // ---- Shared mechanism (graph.cpp) ------------------------------------------------------------
-
-  // Reports the consistency condition "0" and the internal error at `line`: a case that a
-  // consistent graph never reaches.
-  static void reportInternalFault(int line);
-  // The block of `v`, or null after reporting `lineNoPayload` or `lineNoBlock`.
-  KvCBasicBlock* requireBasicBlock(ssaopt::node v, int lineNoPayload, int lineNoBlock) const;
-  // The target of the entry node's first out-edge, or nil.
-  ssaopt::node firstBlockOf(const KvCCfgProcedure& procedure) const;
-  ssaopt::node newBlockNode(KvCCfgProcedure* pProcedure);
-  ssaopt::edge newPlainEdge(ssaopt::node v, ssaopt::node w);
   // Deletes a statement of `block` and remembers it, so that forgetDeletedStatements can take it
   // out of the procedure records, which list calls, parameter and value-return statements.
   void deleteStatement(KvCBasicBlock& block, KvCCfgStatement* pStatement);
   // Takes every statement deleted since the last call out of every procedure record, so that no
   // record points to freed memory.
   void forgetDeletedStatements();
-  // The control-flow out-edges of `v` in adjacency order (SSA edges excluded); nil after the last.
-  ssaopt::edge firstCfgOutEdge(ssaopt::node v) const;
-  ssaopt::edge nextCfgOutEdge(ssaopt::edge e) const;
-
-  // ---- Block surgery (graph.cpp) ---------------------------------------------------------------
-
-  ssaopt::node continueInNewNode(ssaopt::node v, KvCBasicBlock* pBlock, KvCBasicBlock* pTail);
-  void replaceByChain(ssaopt::node v, const KvCBasicBlock& block);
-  ssaopt::node firstBlockOfCallee(ssaopt::node deadEnd, const KvCBasicBlock& block) const;
-  void reportProcedureComponentFaults(const ssaopt::node_array<int>& component, int count) const;
 
   // ---- Visited marks: set by constant propagation, read by dead-code elimination ---------------
 
@@ -203,37 +185,8 @@ private:
   // Fills `fcg` with one node per procedure and one edge per call of another procedure, and
   // refreshes every node's procedure from reachability.
   void buildFunctionCallGraph(ssaopt::graph& fcg, ssaopt::map<ssaopt::node, KvCCfgProcedure*>& procedureOf);
-
-  KvCCfgProcedure* newProcedure(const BxCXString& name);
-  ssaopt::list<ssaopt::node> reachableFrom(ssaopt::node v);
-  bool canBeSplitOff(ssaopt::node v);
-  bool predecessorsCanHoldCalls(ssaopt::node v) const;
-  KvCCfgProcedure* splitOff(ssaopt::node v, const BxCXString& name);
-  void redirectPredecessorsToCalls(ssaopt::node v, const BxCXString& name);
-  void moveRegion(ssaopt::node v, KvCCfgProcedure* pOld, KvCCfgProcedure* pNew);
-  void makeSingleEntry(KvCCfgProcedure* pProcedure);
-  ssaopt::node nodeEnteredFromOutside(ssaopt::node entry);
-  KvCCfgProcedure* splitOffHeader(ssaopt::node header);
-  ssaopt::node insertEmptyBlockBefore(ssaopt::node v);
-  bool isDeadEnd(ssaopt::node v) const;
-  void claimReachableNodes(KvCCfgProcedure* pProcedure, ssaopt::node_array<int>& dist);
-  void addCallEdges(const KvCBasicBlock& block, ssaopt::graph& fcg,
-                    ssaopt::map<ssaopt::node, KvCCfgProcedure*>& procedureOf) const;
-
-  // ---- SSA construction: dominators (dominators.cpp) -------------------------------------------
-
-  friend class KvCControlFlowGraphSSATestAccess;
-  class LengauerTarjan;
-
-  // Immediate dominators of the component whose root (its last node without in-edges) has the
-  // creation number `root`; a component without one is reported.
-  void computeIdomsFast(std::uint32_t root, LengauerTarjan& dominators);
-  // One tree per component, in component numbering, rooted at the component's entry node; returns
-  // the number of trees. freeDominatorTrees deletes them again.
-  int buildDominatorTrees(ssaopt::array<KvCDominatorTree*>& trees);
-  void freeDominatorTrees(ssaopt::array<KvCDominatorTree*>& trees, int count);
-  void fillFrontier(const KvCDominatorTree& tree, ssaopt::node t);
-  ssaopt::node idomOf(ssaopt::node v) const;
+  // What makeProcedureAndCall does to a region, and the procedure table's new entries.
+  class RegionSplitter;
 
   // ---- SSA construction: def/use summaries and interface statements (summaries.cpp) ------------
 
@@ -253,13 +206,17 @@ private:
   // Before the exit of "#main", every output variable is read.
   void placeOutputStatements();
 
-  void addDefsAndUsesOfBlock(const KvCBasicBlock& block, KvCCfgProcedure& procedure) const;
-  void addArgumentUses(KvCCfgProcedure& caller, KvCCfgProcedureCall* pCall) const;
-  static void addUses(KvCCfgProcedure& procedure, const ssaopt::set<KvCCfgVariable*>& variables);
-  void addFormalsToDefinedVariables();
-  static void passFormalWhereArgumentMissing(KvCCfgParamStatement& param,
-                                             const ssaopt::list<KvCCfgProcedureCall*>& calls);
-  ssaopt::node placeValueReturnStatementsAfterCalls(ssaopt::node v);
+  // ---- SSA construction: dominators (dominators.cpp) -------------------------------------------
+
+  class LengauerTarjan;
+
+  // Immediate dominators of the component whose root (its last node without in-edges) has the
+  // creation number `root`; a component without one is reported.
+  void computeIdomsFast(std::uint32_t root, LengauerTarjan& dominators);
+  // One tree per component, in component numbering, rooted at the component's entry node; returns
+  // the number of trees. freeDominatorTrees deletes them again.
+  int buildDominatorTrees(ssaopt::array<KvCDominatorTree*>& trees);
+  void freeDominatorTrees(ssaopt::array<KvCDominatorTree*>& trees, int count);
 
   // ---- SSA construction: phi placement and renaming (ssa.cpp) ----------------------------------
 
@@ -269,64 +226,7 @@ private:
 
   // Fills `sites` and returns the assigned variables in order of first definition.
   ssaopt::list<KvCCfgVariable*> getDefinedVariables(DefinitionSites& sites);
-  KvCBasicBlock* blockForPhiFunctions(ssaopt::node y);
-  KvCBasicBlock* turnExitIntoBlock(ssaopt::node y);
   void renameVariables(ssaopt::array<KvCDominatorTree*>& trees);
-
-  // ---- Procedure inlining (inlining.cpp) -------------------------------------------------------
-
-  using ProcedureSet = ssaopt::set<const KvCCfgProcedure*>;
-
-  // What one run of inlineProcedures knows: the procedures called from one place, and which
-  // procedure each inlined one went into.
-  struct InliningRun {
-    ProcedureSet calledOnce;
-    ssaopt::map<const KvCCfgProcedure*, KvCCfgProcedure*> inlinedInto;
-
-    KvCCfgProcedure* procedureNow(KvCCfgProcedure* pProcedure);
-  };
-
-  // Appends every call in the blocks of `nodes` to its procedure's call list; returns the nodes
-  // whose blocks hold a call, in the order of `nodes`.
-  ssaopt::list<ssaopt::node> registerCalls(const ssaopt::list<ssaopt::node>& nodes);
-  ProcedureSet proceduresCalledOnce() const;
-  // Inlines the call that the block of `v` holds when its procedure is called once; true when it
-  // did, and `v` is gone then.
-  bool inlineProcedureCalls(ssaopt::node v, KvCBasicBlock* pBasicBlock, InliningRun& run);
-  bool canTakeBodyOf(ssaopt::node v, const KvCCfgProcedure& callee) const;
-  void settleProcedures(InliningRun& run);
-  ssaopt::node newParameterBlock(KvCCfgProcedure* pCaller, const KvCCfgProcedure& callee,
-                                 KvCCfgProcedureCall* pCall);
-  void spliceBody(ssaopt::node v, ssaopt::node parameters, KvCCfgProcedure* pCallee);
-
-  // ---- Valid-condition assignments (valid_conditions.cpp) --------------------------------------
-
-  // Makes the assignments that the condition implies on its true and on its false branch (each
-  // null when there is none; the caller owns them), or lets the condition become constant.
-  void createValidConditionAssignments(KvCCfgExpression*& pCond, KvCCfgAssignment*& trueAssign,
-                                       KvCCfgAssignment*& falseAssign);
-  void placeOnBranch(ssaopt::edge e, KvCCfgAssignment* pAssign);
-
-  // ---- Code hoisting (hoisting.cpp) ------------------------------------------------------------
-
-  void performCodeHoisting(ssaopt::node v);
-  // The next statement that the walk down a branch from `e` offers for hoisting, with `e` moved on
-  // past its block; null where the walk has to stop.
-  KvCCfgStatement* nextHoistingCandidate(ssaopt::edge& e, bool skipNext) const;
-  // Whether `s` may move before a branch on `cond`: it must not define what the condition reads.
-  bool checkForHoisting(KvCCfgStatement* s, KvCCfgExpression* cond) const;
-  ssaopt::set<KvCCfgVariable*> variablesDefinedBy(KvCCfgStatement* s) const;
-  void deleteSSAEdges();
-
-  ssaopt::node m_StartNode;
-  ProcedureTable m_Procedures;
-  // Absent entries read as false.
-  ssaopt::node_array<bool> m_Visited;
-  // Reached-marks for the walks of makeProcedureAndCall: all false between walks, so that a walk
-  // costs the size of what it reaches, not of the whole graph.
-  ssaopt::node_array<bool> m_Reached;
-  // Statements deleted since the procedure records last forgot them (compared, never read).
-  ssaopt::set<const KvCCfgStatement*> m_DeletedStatements;
 
   // ---- Sparse conditional constant propagation (constant_propagation.cpp) ----------------------
 
@@ -334,10 +234,8 @@ private:
   using EdgeWorkList = ssaopt::queue<ssaopt::edge>;
 
   // What one call of sparseConditionalConstant keeps while it runs: which procedures need another
-  // visit, which edges carry the executable flag, and the merges of the phi functions. It lives on
-  // that call's stack; m_pPropagation names it meanwhile and is null otherwise.
+  // visit, which edges carry the executable flag, and the merges of the phi functions.
   class PropagationRun;
-  PropagationRun* m_pPropagation = nullptr;
 
   void buildVarUses();
   void initSparseConditionalConstant(ssaopt::node entry, EdgeWorkList& cfgWorkList,
@@ -367,11 +265,46 @@ private:
   // The deletion of one dead block and of the phi operands of its edges.
   class DeadCodeSweep;
 
-  // The edges that divideBasicBlock made between the pieces of one block. The operand removal walks
-  // a chain of phi nodes along these only, never on into the next block.
-  ssaopt::edge_array<bool> m_DividedBlockLinks;
-
   // ---- Constant substitution, folding and unused definitions (substitution.cpp) ---------------
 
   class UnusedDefinitionRemoval;
+
+  // ---- Valid-condition assignments (valid_conditions.cpp) --------------------------------------
+
+  // Makes the assignments that the condition implies on its true and on its false branch (each
+  // null when there is none; the caller owns them), or lets the condition become constant.
+  void createValidConditionAssignments(KvCCfgExpression*& pCond, KvCCfgAssignment*& trueAssign,
+                                       KvCCfgAssignment*& falseAssign);
+
+  // ---- Procedure inlining (inlining.cpp) -------------------------------------------------------
+
+  // What one run of inlineProcedures knows and does besides the inlining of one call.
+  class InliningRun;
+  // Inlines the call that the block of `v` holds when its procedure is called once; true when it
+  // did, and `v` is gone then.
+  bool inlineProcedureCalls(ssaopt::node v, KvCBasicBlock* pBasicBlock, InliningRun& run);
+
+  // ---- Code hoisting (hoisting.cpp) ------------------------------------------------------------
+
+  void performCodeHoisting(ssaopt::node v);
+  // Whether `s` may move before a branch on `cond`: it must not define what the condition reads.
+  bool checkForHoisting(KvCCfgStatement* s, KvCCfgExpression* cond) const;
+  void deleteSSAEdges();
+
+  // ---- The graph's state -------------------------------------------------------------------------
+
+  ssaopt::node m_StartNode;
+  ProcedureTable m_Procedures;
+  // Absent entries read as false.
+  ssaopt::node_array<bool> m_Visited;
+  // Reached-marks for the walks of RegionSplitter: all false between walks, so that a walk costs the
+  // size of what it reaches, not of the whole graph.
+  ssaopt::node_array<bool> m_Reached;
+  // Statements deleted since the procedure records last forgot them (compared, never read).
+  ssaopt::set<const KvCCfgStatement*> m_DeletedStatements;
+  // The edges that divideBasicBlock made between the pieces of one block. The operand removal walks
+  // a chain of phi nodes along these only, never on into the next block.
+  ssaopt::edge_array<bool> m_DividedBlockLinks;
+  // The propagation in progress, on the stack of sparseConditionalConstant; null outside it.
+  PropagationRun* m_pPropagation = nullptr;
 };
