@@ -129,7 +129,7 @@ public:
       bool changed = false;
       for (std::size_t procedure = 0; procedure <= last; ++procedure)
         if (m_Unsettled[procedure] || procedure == last) visitProcedure(procedure, changed);
-      bool deleted = removeDeadCode && m_G.eliminateDeadCode();
+      bool deleted = removeDeadCode && sweepDeadCode();
       repeat = changed || deleted;
     }
   }
@@ -204,36 +204,21 @@ public:
   // ---- Phi functions ----
 
   // The phi functions of two operands, the most common by far, are merged from scratch at every visit;
-  // a merge is kept for the others, and one of many operands keeps partial results.
+  // a merge is kept for the others, and one of many operands keeps partial results. Dead-code
+  // elimination only ever takes operands away, so a kept merge is current while the phi function has
+  // as many operands as when the merge was made.
   PhiMerge::Result mergeOperands(node v, const KvCPhiFunction& phi) {
-    if (m_MergeAt[v] != kNone) return m_Merges[static_cast<std::size_t>(m_MergeAt[v])].merge();
+    int kept = m_MergeAt[v];
+    if (kept != kNone && m_MergedDimensions[static_cast<std::size_t>(kept)] == phi.getDimension())
+      return m_Merges[static_cast<std::size_t>(kept)].merge();
+    if (kept != kNone) forgetMerge(v);
     PhiMerge::distinctOperands(phi, m_Operands);
     if (m_Operands.size() <= kMergedFromScratch) return PhiMerge::mergeAll(m_Operands);
     m_MergeAt[v] = static_cast<int>(m_Merges.size());
     m_Merges.emplace_back(m_Operands);
+    m_MergedDimensions.push_back(phi.getDimension());
     if (m_Merges.back().readsOnlyChangedBlocks()) registerOperands(m_Merges.size() - 1);
     return m_Merges.back().merge();
-  }
-
-  // The merge at `link` no longer matches its operands; its registrations are left to lead nowhere.
-  void forgetMerge(node link) {
-    int merge = m_MergeAt[link];
-    if (merge == kNone) return;
-    m_Merges[static_cast<std::size_t>(merge)] = PhiMerge();
-    m_MergeAt[link] = kNone;
-  }
-
-  // ---- Dead blocks ----
-
-  // The blocks it leads to lose in-edges and phi operands; a deleted call takes its arguments out of
-  // the parameter statements of the procedure it calls.
-  void unsettleProceduresOfDeadBlock(node n) {
-    unsettleProcedureOf(n);
-    for (edge e = firstCfgOutEdge(m_G, n); e; e = nextCfgOutEdge(m_G, e)) unsettleProcedureOf(m_G.target(e));
-    for (KvCCfgStatement* pStatement : m_G.getBasicBlock(n)->getStatementSeq())
-      if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall())
-        if (KvCCfgProcedure* pCallee = m_G.findProcedure(pCall->getName()))
-          unsettleProcedureOf(pCallee->getEntryNode());
   }
 
 private:
@@ -273,6 +258,31 @@ private:
     }
     m_Unsettled.assign(m_Entries.size(), true);
     m_VisitedBy.assign(m_Entries.size(), {});
+  }
+
+  // The merge at `v` no longer matches its operands; its registrations are left to lead nowhere.
+  void forgetMerge(node v) {
+    m_Merges[static_cast<std::size_t>(m_MergeAt[v])] = PhiMerge();
+    m_MergeAt[v] = kNone;
+  }
+
+  // Before dead-code elimination deletes the blocks that the pass did not reach, the procedures they
+  // touch are unsettled: the blocks they lead to lose in-edges and phi operands, and a deleted call
+  // takes its arguments out of the parameter statements of the procedure it calls. Entry and exit
+  // nodes stay, reached or not.
+  bool sweepDeadCode() {
+    for (node n : m_G.nodes())
+      if (!m_G.isVisited(n) && m_G.getBasicBlock(n)) unsettleProceduresOfDeadBlock(n);
+    return m_G.eliminateDeadCode();
+  }
+
+  void unsettleProceduresOfDeadBlock(node n) {
+    unsettleProcedureOf(n);
+    for (edge e = firstCfgOutEdge(m_G, n); e; e = nextCfgOutEdge(m_G, e)) unsettleProcedureOf(m_G.target(e));
+    for (KvCCfgStatement* pStatement : m_G.getBasicBlock(n)->getStatementSeq())
+      if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall())
+        if (KvCCfgProcedure* pCallee = m_G.findProcedure(pCall->getName()))
+          unsettleProcedureOf(pCallee->getEntryNode());
   }
 
   void deactivateAllEdges() {
@@ -378,6 +388,7 @@ private:
   // The merges kept for phi functions, by node, and where the incremental ones read each variable.
   ssaopt::node_array<int> m_MergeAt;
   array<PhiMerge> m_Merges;
+  array<int> m_MergedDimensions;  // per merge: the operands of its phi function when it was made
   ssaopt::cfg::VariableTable<Reader> m_Readers;
   array<KvCCfgVariable*> m_Operands;  // scratch
 };
@@ -504,7 +515,3 @@ int KvCControlFlowGraph::countCfgOutEdges(node v) const {
   for (edge e = firstCfgOutEdge(*this, v); e; e = nextCfgOutEdge(*this, e)) ++count;
   return count;
 }
-
-void KvCControlFlowGraph::forgetDeadBlock(node n) { m_pPropagation->unsettleProceduresOfDeadBlock(n); }
-
-void KvCControlFlowGraph::forgetPhiOperands(node link) { m_pPropagation->forgetMerge(link); }

@@ -43,7 +43,6 @@ public:
     removeDeadInEdges(t);
     for (node link = t; KvCPhiFunction* pPhi = phiFunctionAt(link); link = nextPhiChainLink(link)) {
       removeOperands(link, *pPhi);
-      m_G.forgetPhiOperands(link);
     }
   }
 
@@ -129,7 +128,6 @@ bool KvCControlFlowGraph::eliminateDeadCode() {
   bool removedOperand = false;
   for (node n : nodes()) {
     if (!sweep.isDeadBlock(n)) continue;
-    forgetDeadBlock(n);
     while (node t = sweep.reachedPhiSuccessor(n)) {
       sweep.removeDeadOperands(t);
       removedOperand = true;

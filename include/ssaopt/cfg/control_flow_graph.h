@@ -252,10 +252,6 @@ private:
   void visitPhiFunction(KvCPhiFunction* pPhi, ssaopt::node v, bool& changed);
   int countExecutableInEdges(ssaopt::node v) const;
   int countCfgOutEdges(ssaopt::node v) const;
-  // Dead-code elimination tells the propagation in progress what it changes: a block it is about to
-  // delete, and a phi function that lost operands.
-  void forgetDeadBlock(ssaopt::node n);
-  void forgetPhiOperands(ssaopt::node link);
 
   // ---- Dead-code elimination (dead_code.cpp) ---------------------------------------------------
 
