@@ -11,6 +11,7 @@
 #include "ssaopt/client/c_emitter.h"
 #include "ssaopt/client/dot.h"
 #include "ssaopt/client/front_end.h"
+#include "ssaopt/client/pipeline.h"
 #include "ssaopt/client/printer.h"
 #include "ssaopt/frame/control.h"
 #include "ssaopt/frame/pool.h"
@@ -22,6 +23,19 @@ namespace ssaopt::tool {
 namespace {
 
 using Clock = std::chrono::steady_clock;
+
+class Run;
+
+// The client's part in every step, then what the options ask for after it: counts, times, the program
+// printed, the graph verified.
+class ObservedSteps : public client::ProgramSteps {
+public:
+  ObservedSteps(client::Program& program, Run& run) : client::ProgramSteps(program), m_Run(run) {}
+  void runStep(const ssaopt::PipelineStep& step, KvCControlFlowGraph& graph) override;
+
+private:
+  Run& m_Run;
+};
 
 class Run {
 public:
@@ -35,7 +49,8 @@ public:
     if (!load()) return kFailure;
     if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), "the front end");
     GraphCounts before = countGraph(m_pProgram->graph());
-    for (const std::string& name : pipeline) runPass(*findPass(name));
+    ObservedSteps steps(*m_pProgram, *this);
+    ssaopt::runPipeline(m_pProgram->graph(), client::pipelineNamed(pipeline), steps);
     writeNotices();
     bool written = writeResult();
     if (m_Options.stats) writeStatistics(m_Err, before, countGraph(m_pProgram->graph()), m_Removed);
@@ -54,16 +69,19 @@ private:
     return m_pProgram != nullptr;
   }
 
-  void runPass(const Pass& pass) {
+  // Runs `runClientStep` (the client's part and the library's step) and observes it.
+  template <class RunStep>
+  void observeStep(const ssaopt::PipelineStep& step, RunStep runClientStep) {
     GraphCounts ahead = m_Options.stats ? countGraph(m_pProgram->graph()) : GraphCounts();
     Clock::time_point start = Clock::now();
-    pass.run(*m_pProgram);
-    m_Times.emplace_back(pass.name, std::chrono::duration<double, std::milli>(Clock::now() - start).count());
+    runClientStep();
+    m_Times.emplace_back(step.name, std::chrono::duration<double, std::milli>(Clock::now() - start).count());
     if (m_Options.stats) m_Removed.add(ahead, countGraph(m_pProgram->graph()));
     if (m_Options.printAfterAll)
-      m_Err << "// ---- after " << pass.name << " ----\n" << client::printProgram(*m_pProgram);
-    if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), std::string("pass ") + pass.name);
+      m_Err << "// ---- after " << step.name << " ----\n" << client::printProgram(*m_pProgram);
+    if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), std::string("pass ") + step.name);
   }
+  friend class ObservedSteps;
 
   // What the client's expressions noticed while the passes ran.
   void writeNotices() {
@@ -116,6 +134,10 @@ private:
   std::vector<std::pair<std::string, double>> m_Times;
   RemovedCounts m_Removed;
 };
+
+void ObservedSteps::runStep(const ssaopt::PipelineStep& step, KvCControlFlowGraph& graph) {
+  m_Run.observeStep(step, [&] { client::ProgramSteps::runStep(step, graph); });
+}
 
 }  // namespace
 

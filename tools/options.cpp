@@ -161,15 +161,6 @@ std::string parseArgument(const std::vector<std::string>& arguments, std::size_t
   return "";
 }
 
-// " (after ssa, divide)", " (before ssa)" or " (once)" for a pass that can run only there.
-std::string whereThePassRuns(const Pass& pass) {
-  std::string after;
-  for (std::string_view need : pass.needs) after += (after.empty() ? "after " : ", ") + std::string(need);
-  if (!after.empty()) return " (" + after + ")";
-  if (!pass.beforeSSAOnly) return "";
-  return std::string_view(pass.name) == "ssa" ? " (once)" : " (before ssa)";
-}
-
 }  // namespace
 
 ParsedOptions parseOptions(const std::vector<std::string>& arguments) {

@@ -50,11 +50,13 @@ bool sharesAny(const Variables& a, const Variables& b) {
 }  // namespace
 
 void KvCControlFlowGraph::hoistCodeOutOfIfElseBranches() {
+  if (!beginStep(ssaopt::GraphOperation::HoistCodeOutOfIfElseBranches)) return;
   deleteSSAEdges();
   for (node v : all_nodes()) {
     const KvCBasicBlock* pBlock = getBasicBlock(v);
     if (pBlock && pBlock->getBranchCond()) performCodeHoisting(v);
   }
+  endStep(ssaopt::GraphOperation::HoistCodeOutOfIfElseBranches);
 }
 
 // Each pass takes the next statement down each branch; the pair moves when the statements generate

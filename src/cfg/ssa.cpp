@@ -59,6 +59,7 @@ constexpr RenamingFault kNoVersionForValueReturn{2087, false};
 // The check points run only while internal information is shown; a failed one is reported and the
 // transformation goes on.
 void KvCControlFlowGraph::transformToSSAForm() {
+  if (!beginStep(ssaopt::GraphOperation::TransformToSSAForm)) return;
   array<KvCDominatorTree*> trees;
   collectVarDefsAndUses();
   initVariablesAfterEntryNodes();
@@ -74,6 +75,7 @@ void KvCControlFlowGraph::transformToSSAForm() {
   KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kClassName, kLineCheckAfterPhiFunctions);
   renameVariables(trees);
   freeDominatorTrees(trees, count);
+  endStep(ssaopt::GraphOperation::TransformToSSAForm);
 }
 
 // ---- Phi placement -------------------------------------------------------------------------------
@@ -98,6 +100,7 @@ list<KvCCfgVariable*> KvCControlFlowGraph::getDefinedVariables(DefinitionSites& 
 // variable that put the node on the worklist (work) and gave it a phi function (hasAlready), so that
 // nothing is cleared between variables. The placement is minimal, not pruned: liveness is not asked.
 void KvCControlFlowGraph::placePhiFunction() {
+  if (!beginStep(ssaopt::GraphOperation::PlacePhiFunction)) return;
   node_array<int> work(*this, 0);
   node_array<int> hasAlready(*this, 0);
   DefinitionSites sites;
@@ -125,6 +128,7 @@ void KvCControlFlowGraph::placePhiFunction() {
       }
     }
   }
+  endStep(ssaopt::GraphOperation::PlacePhiFunction);
 }
 
 // An exit node becomes a block the first time it needs a phi function; any other node of a frontier

@@ -42,7 +42,7 @@ protected:
     return ssaopt::client::printProgram(*pProgram, ssaopt::client::PrintOptions{showValues});
   }
   static void toDividedSSA(ssaopt::client::Program& program) {
-    program.completeCallLists();
+    program.graph().completeCallLists();
     program.graph().transformToSSAForm();
     program.transformKeepingLabels([&program] { program.graph().divideBasicBlock(); });
   }

@@ -18,7 +18,7 @@ protected:
   std::string transformed(const char* text) {
     m_pProgram = load(text);
     if (!m_pProgram) return "";
-    m_pProgram->completeCallLists();
+    m_pProgram->graph().completeCallLists();
     m_pProgram->graph().transformToSSAForm();
     return ssaopt::client::printProgram(*m_pProgram);
   }

@@ -60,7 +60,8 @@ public:
   const Terms& getTerms() const { return m_Terms; }
   // A new expression with the same terms, owned by the same store.
   KvCCfgSFExpression* clone() const;
-  // Would be emitted as the same C text: the same terms, SSA versions read as their variables.
+  // Would be emitted as the same C text and computes the same value: the same terms, reading the same
+  // SSA versions (as hoisting will leave them, see versionReadAfterHoisting).
   bool generatesSameCodeAs(const KvCCfgSFExpression& other) const;
   // The element write a[i] = e, whose last term names the array.
   bool isElementWrite() const;
