@@ -51,6 +51,7 @@ bool parseFlag(const std::string& argument, Options& options) {
       {"--stats", &Options::stats},
       {"--time-passes", &Options::timePasses},
       {"--show-values", &Options::showValues},
+      {"--random-passes", &Options::randomPasses},
       {"--help", &Options::help},
       {"-h", &Options::help},
       {"--version", &Options::version},
@@ -128,6 +129,8 @@ std::string checkCommandOptions(const Options& options) {
     return "--programs belongs to the fuzz command";
   if (options.steps == 0u || options.runs == 0u) return "--steps and --runs need at least 1";
   if (options.programs == 0u) return "--programs needs at least 1";
+  if (options.randomPasses && options.command != Command::Fuzz) return "--random-passes belongs to the fuzz command";
+  if (options.randomPasses && options.passes) return "--random-passes and --passes exclude each other";
   if (options.passes) return findPipelineError(*options.passes);
   return "";
 }
@@ -187,7 +190,7 @@ std::string usageText() {
           "       ssaopt check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S]\n"
           "       ssaopt cc-check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S]\n"
           "       ssaopt generate [--seed S] [--size N]\n"
-          "       ssaopt fuzz [--programs P] [--seed S] [--size N] [--passes=LIST]\n"
+          "       ssaopt fuzz [--programs P] [--seed S] [--size N] [--passes=LIST | --random-passes]\n"
           "\n"
           "Reads a program in the textual format, runs a pipeline of transformations on its\n"
           "control-flow graph and writes the result.\n"
@@ -222,6 +225,8 @@ std::string usageText() {
           "  --programs P       programs fuzz checks (default "
        << kDefaultPrograms
        << ")\n"
+          "  --random-passes    take each program through a random pipeline that can run,\n"
+          "                     drawn from its seed, instead of the default one\n"
           "\n"
           "options:\n"
           "  --passes=LIST      run these passes in order (comma-separated) instead of the\n"

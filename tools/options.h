@@ -45,6 +45,8 @@ struct Options {
   // Of generate and fuzz: the size of each program, and how many programs fuzz checks.
   std::optional<std::uint64_t> size;
   std::optional<std::uint64_t> programs;
+  // Of fuzz: each program goes through a random pipeline that can run, drawn from its seed.
+  bool randomPasses = false;
 };
 
 struct ParsedOptions {

@@ -131,6 +131,15 @@ bool KvCCfgSFExpression::isElementWrite() const {
   return !m_Terms.empty() && m_Terms.back().op == TermOp::ElementWrite;
 }
 
+// The value of an element write is the complete sub-expression right before it; one that ends in a
+// literal is that literal.
+double* KvCCfgSFExpression::storedLiteral() {
+  bool elementWrite = isElementWrite();
+  if (m_Terms.size() != 1 && !(elementWrite && m_Terms.size() >= 3)) return nullptr;
+  Term& value = m_Terms[elementWrite ? m_Terms.size() - 2 : 0];
+  return value.op == TermOp::Literal ? &value.number : nullptr;
+}
+
 namespace ssaopt::client {
 
 ExpressionStore::~ExpressionStore() = default;

@@ -2,7 +2,9 @@
 
 #include <utility>
 
+#include "front_end_steps.h"
 #include "ssaopt/client/hoisting.h"
+#include "ssaopt/client/interpreter.h"
 #include "ssaopt/client/variable.h"
 
 KvCCfgSFAssignment::KvCCfgSFAssignment(KvCCfgVariable* pLHS, KvCCfgSFExpression* pRHS) {
@@ -19,8 +21,19 @@ KvCCfgStatement* KvCCfgSFAssignment::clone() const {
   return new KvCCfgSFAssignment(getLHS(), pRHS ? pRHS->clone() : nullptr);
 }
 
+// A folded value that the variable cannot hold becomes the value the store leaves, which the textual
+// format can hold (its front end rejects a literal that does not fit), where storing that stores the
+// same: not where the cast wraps a value past a saturation limit (-1 into a uint32 saturated at 20
+// stores 4294967295, which stored again is 20).
 void KvCCfgSFAssignment::foldConstants() {
-  if (getRHS()) getRHS()->foldConstants();
+  KvCCfgSFExpression* pRHS = getSFRHS();
+  if (!pRHS) return;
+  pRHS->foldConstants();
+  double* pLiteral = pRHS->storedLiteral();
+  KvCCfgSFVariable* pVariable = getLHS() ? ssaopt::client::originalOf(getLHS())->isSFVariable() : nullptr;
+  if (!pLiteral || !pVariable || ssaopt::client::detail::variableHolds(*pVariable, *pLiteral)) return;
+  double stored = ssaopt::client::storedValue(*pVariable, *pLiteral);
+  if (ssaopt::client::storedValue(*pVariable, stored) == stored) *pLiteral = stored;
 }
 
 bool KvCCfgSFAssignment::generatesSameCode(KvCCfgStatement* pOther) const {

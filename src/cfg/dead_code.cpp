@@ -56,23 +56,22 @@ public:
   }
 
 private:
-  // The parameter statements stand in the blocks right after the entry, alone or one per block. A
-  // dead node is not noted: its destruction takes it out of every use set.
+  // The parameter statements stand in the blocks right after the entry, together or one per block
+  // (some emptied by removeUnusedVarDefs). A dead node is not noted: its destruction takes it out of
+  // every use set.
   template <class IsDead>
   void noteParametersOf(const KvCControlFlowGraph& G, const KvCCfgProcedure& callee, IsDead isDead) {
     node entry = callee.getEntryNode();
     node v = entry && G.outdeg(entry) == 1 ? G.target(G.first_adj_edge(entry)) : node(nil);
-    while (v && holdsParametersOnly(G.getBasicBlock(v))) {
+    while (v && holdsParametersOrNothing(G.getBasicBlock(v))) {
       if (!isDead(v)) m_ReadBefore[v] = G.getBasicBlock(v)->getUsedVariables();
       ssaopt::array<edge> out = G.getControlFlowOutEdges(v);
       v = out.size() == 1 ? G.target(out[0]) : node(nil);
     }
   }
 
-  static bool holdsParametersOnly(const KvCBasicBlock* pBlock) {
-    if (!pBlock || pBlock->getStatementSeq().empty() || pBlock->getBranchCond() ||
-        !pBlock->getPhiFunctions().empty())
-      return false;
+  static bool holdsParametersOrNothing(const KvCBasicBlock* pBlock) {
+    if (!pBlock || pBlock->getBranchCond() || !pBlock->getPhiFunctions().empty()) return false;
     for (KvCCfgStatement* pStatement : pBlock->getStatementSeq())
       if (!pStatement->isParamStatement()) return false;
     return true;

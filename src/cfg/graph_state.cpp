@@ -15,7 +15,8 @@ using Op = GraphOperation;
 // ---- Why each step puts its conditions -----------------------------------------------------------
 
 constexpr FactCondition kMakeProcedureAndCall[] = {
-    {Fact::ExitsPlaced, false, "the new procedure would have no exit node and its region would reach the old one's"},
+    {Fact::ExitsPlaced, false,
+     "the new procedure would have no exit node and its region would reach the old one's"},
 };
 constexpr FactCondition kSetParametersOfCall[] = {
     {Fact::SSAForm, false, "parameter statements are placed by the SSA transformation"},
@@ -59,6 +60,9 @@ constexpr FactCondition kSparseConditionalConstant[] = {
     {Fact::Divided, true, "a visit takes one phi function, one statement or one condition per block"},
     {Fact::SSAEdges, true, "values travel along the SSA edges"},
 };
+constexpr FactCondition kRemoveUnusedVarDefs[] = {
+    {Fact::SSAForm, true, "before it, what the arguments of calls read is read by no block"},
+};
 constexpr FactCondition kPropagateSparseConditionalConstant[] = {
     {Fact::SSAForm, true, "values are propagated between versions"},
     {Fact::Divided, true, "a visit takes one phi function, one statement or one condition per block"},
@@ -84,7 +88,8 @@ const StepContract kContracts[] = {
              {Fact::Divided, Fact::UseSets}),
     contract(Op::SetParametersOfCall, "setParametersOfCall", kSetParametersOfCall, {}, {}),
     contract(Op::PlaceExitNodes, "placeExitNodes", kPlaceExitNodes, {Fact::ExitsPlaced}, {}),
-    contract(Op::PlaceLoopAroundMain, "placeLoopAroundMain", kPlaceLoopAroundMain, {Fact::LoopAroundMain}, {}),
+    contract(Op::PlaceLoopAroundMain, "placeLoopAroundMain", kPlaceLoopAroundMain, {Fact::LoopAroundMain},
+             {}),
     contract(Op::SplitBlock, "splitAtStatement and splitAtCondition", kSplitBlock, {}, {Fact::UseSets}),
     contract(Op::DivideBasicBlock, "divideBasicBlock", kDivideBasicBlock, {Fact::Divided}, {Fact::UseSets}),
     contract(Op::InlineProcedures, "inlineProcedures", kInlineProcedures, {}, {Fact::Divided, Fact::UseSets}),
@@ -102,7 +107,7 @@ const StepContract kContracts[] = {
     unconditional(Op::ReplaceConstantVariables, "replaceConstantVariables", {}, {Fact::UseSets}),
     unconditional(Op::ReplaceConstantConditions, "replaceConstantConditions", {}, {Fact::UseSets}),
     unconditional(Op::FoldConstants, "foldConstants", {}, {Fact::UseSets}),
-    unconditional(Op::RemoveUnusedVarDefs, "removeUnusedVarDefs", {Fact::UseSets}, {}),
+    contract(Op::RemoveUnusedVarDefs, "removeUnusedVarDefs", kRemoveUnusedVarDefs, {Fact::UseSets}, {}),
     unconditional(Op::HoistCodeOutOfIfElseBranches, "hoistCodeOutOfIfElseBranches", {},
                   {Fact::SSAEdges, Fact::UseSets}),
 };
@@ -145,8 +150,8 @@ GraphState stateAfter(GraphOperation operation, GraphState state) {
 BxCXString describeRefusal(GraphOperation operation, GraphState state) {
   const FactCondition* pUnmet = unmetCondition(operation, state);
   if (!pUnmet) return BxCXString();
-  return BxCXString(contractOf(operation).name) + ": " + describeFact(pUnmet->fact, !pUnmet->mustHold) + " (" +
-         pUnmet->reason + ")";
+  return BxCXString(contractOf(operation).name) + ": " + describeFact(pUnmet->fact, !pUnmet->mustHold) +
+         " (" + pUnmet->reason + ")";
 }
 
 }  // namespace ssaopt

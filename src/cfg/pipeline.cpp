@@ -19,47 +19,56 @@ constexpr int kLinePipelineStopped = 4001;
 constexpr const char* kReportingClass = "ssaopt::runPipeline";
 
 const PipelineStep kSteps[] = {
-    {"inline", "put the body of each procedure called from one place in place of its call", Op::InlineProcedures,
-     [](KvCControlFlowGraph& G) { G.inlineProcedures(); }},
+    {"inline", "put the body of each procedure called from one place in place of its call",
+     Op::InlineProcedures, [](KvCControlFlowGraph& G) { G.inlineProcedures(); }},
     {"valid-conditions", "record on each branch what its condition implies (virtual assignments)",
-     Op::InsertValidConditionAssignments, [](KvCControlFlowGraph& G) { G.insertValidConditionAssignments(); }},
+     Op::InsertValidConditionAssignments,
+     [](KvCControlFlowGraph& G) { G.insertValidConditionAssignments(); }},
     {"ssa", "transform to SSA form (registering every call not yet registered first)", Op::TransformToSSAForm,
      [](KvCControlFlowGraph& G) {
        G.completeCallLists();
        G.transformToSSAForm();
      }},
-    {"divide", "give every block one phi function, one statement or its condition alone", Op::DivideBasicBlock,
-     [](KvCControlFlowGraph& G) { G.divideBasicBlock(); }},
+    {"divide", "give every block one phi function, one statement or its condition alone",
+     Op::DivideBasicBlock, [](KvCControlFlowGraph& G) { G.divideBasicBlock(); }},
     {"sccp", "sparse conditional constant propagation, removing unreachable code",
      Op::PropagateSparseConditionalConstant,
      [](KvCControlFlowGraph& G) { G.propagateSparseConditionalConstant(true); }},
     {"sccp-keep-dead", "sparse conditional constant propagation, keeping unreachable code",
      Op::PropagateSparseConditionalConstant,
      [](KvCControlFlowGraph& G) { G.propagateSparseConditionalConstant(false); }},
-    {"ssa-edges", "add the SSA def-use edges", Op::AddSSAEdges, [](KvCControlFlowGraph& G) { G.addSSAEdges(); }},
+    {"ssa-edges", "add the SSA def-use edges", Op::AddSSAEdges,
+     [](KvCControlFlowGraph& G) { G.addSSAEdges(); }},
     {"propagate", "propagate constants over the SSA edges present, removing unreachable code",
      Op::SparseConditionalConstant, [](KvCControlFlowGraph& G) { G.sparseConditionalConstant(true); }},
     {"propagate-keep-dead", "propagate constants over the SSA edges present, keeping unreachable code",
      Op::SparseConditionalConstant, [](KvCControlFlowGraph& G) { G.sparseConditionalConstant(false); }},
-    {"replace-constants", "put constants in place of reads of constant variables", Op::ReplaceConstantVariables,
-     [](KvCControlFlowGraph& G) { G.replaceConstantVariables(); }},
-    {"replace-conditions", "put constants in place of constant branch conditions", Op::ReplaceConstantConditions,
-     [](KvCControlFlowGraph& G) { G.replaceConstantConditions(); }},
-    {"fold", "fold constant sub-expressions", Op::FoldConstants, [](KvCControlFlowGraph& G) { G.foldConstants(); }},
+    {"replace-constants", "put constants in place of reads of constant variables",
+     Op::ReplaceConstantVariables, [](KvCControlFlowGraph& G) { G.replaceConstantVariables(); }},
+    {"replace-conditions", "put constants in place of constant branch conditions",
+     Op::ReplaceConstantConditions, [](KvCControlFlowGraph& G) { G.replaceConstantConditions(); }},
+    {"fold", "fold constant sub-expressions", Op::FoldConstants,
+     [](KvCControlFlowGraph& G) { G.foldConstants(); }},
     {"remove-unused", "remove definitions of erasable variables that nothing uses", Op::RemoveUnusedVarDefs,
      [](KvCControlFlowGraph& G) { G.removeUnusedVarDefs(); }},
     {"hoist", "move statements that both branches of an if/else begin with before the branch",
      Op::HoistCodeOutOfIfElseBranches, [](KvCControlFlowGraph& G) { G.hoistCodeOutOfIfElseBranches(); }},
 };
 
-const char* const kTypicalRun[] = {"inline", "valid-conditions", "ssa",  "divide", "sccp", "replace-constants",
-                                   "replace-conditions", "fold", "remove-unused", "hoist"};
+const char* const kTypicalRun[] = {
+    "inline", "valid-conditions", "ssa",  "divide", "sccp", "replace-constants", "replace-conditions",
+    "fold",   "remove-unused",    "hoist"};
 
 // Short names of the facts, for texts that list several, and how a step is refused on one: "not in SSA
 // form", "not with SSA edges".
 const char* const kFactNames[kGraphFactCount][2] = {
-    {"exit nodes", "with"}, {"the loop around \"#main\"", "with"}, {"SSA form", "in"}, {"divided blocks", "with"},
-    {"SSA edges", "with"},  {"up-to-date use sets", "with"},          {"propagation results", "with"},
+    {"exit nodes", "with"},
+    {"the loop around \"#main\"", "with"},
+    {"SSA form", "in"},
+    {"divided blocks", "with"},
+    {"SSA edges", "with"},
+    {"up-to-date use sets", "with"},
+    {"propagation results", "with"},
 };
 
 const char* factName(GraphFact fact) { return kFactNames[static_cast<int>(fact)][0]; }
@@ -99,7 +108,8 @@ BxCXString explainUnmet(const PipelineStep& step, const FactCondition& unmet, co
   if (unmet.mustHold && !pChanger)
     return pass + " needs " + stepsThatSet(unmet.fact) + " earlier in the pipeline: " + what;
   if (unmet.mustHold)
-    return pass + " needs " + stepsThatSet(unmet.fact) + " again after " + quoted(pChanger->name) + ": " + what;
+    return pass + " needs " + stepsThatSet(unmet.fact) + " again after " + quoted(pChanger->name) + ": " +
+           what;
   if (pChanger) return pass + " cannot run after " + quoted(pChanger->name) + ": " + what;
   return pass + " cannot run on this graph: " + what;
 }
@@ -157,7 +167,7 @@ BxCXString describeWhereStepRuns(const PipelineStep& step) {
 
 bool runPipeline(KvCControlFlowGraph& graph, const Pipeline& pipeline, PipelineClient& client) {
   for (const PipelineStep* pStep : pipeline) {
-    BxCXString refusal = graph.checkReadiness(pStep->operation);
+    BxCXString refusal = describeRefusal(pStep->operation, graph.getState());
     if (!refusal.empty()) {
       reportStop(*pStep, refusal);
       return false;

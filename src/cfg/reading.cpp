@@ -48,7 +48,8 @@ bool KvCControlFlowGraph::holdsPhiFunctionOrNothing(node v) const {
 }
 
 bool KvCControlFlowGraph::isPhiChainLink(edge e) const {
-  return isDividedBlockLink(e) && holdsPhiFunctionOrNothing(source(e)) && holdsPhiFunctionOrNothing(target(e));
+  return isDividedBlockLink(e) && holdsPhiFunctionOrNothing(source(e)) &&
+         holdsPhiFunctionOrNothing(target(e));
 }
 
 // A piece after the first has the link from the piece before as its only control-flow in-edge.
@@ -110,7 +111,8 @@ private:
 }  // namespace
 
 // The blocks are bucketed by procedure first, so the whole layout is linear in the graph.
-array<ssaopt::ProcedureBlocks> KvCControlFlowGraph::getProgramOrder(const std::function<bool(node)>& isShown) const {
+array<ssaopt::ProcedureBlocks> KvCControlFlowGraph::getProgramOrder(
+    const std::function<bool(node)>& isShown) const {
   array<ssaopt::ProcedureBlocks> procedures;
   for (const auto& named : m_Procedures) procedures.push_back({named.second, {}});
   std::sort(procedures.begin(), procedures.end(), [](const auto& a, const auto& b) {

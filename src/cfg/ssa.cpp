@@ -75,6 +75,10 @@ void KvCControlFlowGraph::transformToSSAForm() {
   KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kClassName, kLineCheckAfterPhiFunctions);
   renameVariables(trees);
   freeDominatorTrees(trees, count);
+  // Phi placement asked every block for the variables it assigns; renaming has since given each
+  // definition its version, which the lists must name for the steps that build use sets from them.
+  for (node v : nodes())
+    if (KvCBasicBlock* pBlock = getBasicBlock(v)) pBlock->recomputeAssignedVariables();
   endStep(ssaopt::GraphOperation::TransformToSSAForm);
 }
 

@@ -11,6 +11,7 @@
 // nodes, statements and edges. Needs nothing of the graph's state.
 #include <cstdarg>
 #include <cstdio>
+#include <string>
 #include <unordered_map>
 #include <unordered_set>
 
@@ -35,18 +36,18 @@ namespace {
 // The "source line" of each kind of violation, so that a report names the check that failed.
 enum Check : int {
   kPayloads = 5000,
-  kComponents = 5001,         // invariant 1: one component per procedure
-  kEntryAlone = 5002,         // invariant 2: the entry is the only node without in-edges
-  kProcedureOfNode = 5003,    // invariant 3
-  kEntryEdge = 5004,          // invariant 4: one out-edge, to the first block
-  kBranchEdges = 5005,        // invariant 5
-  kCallsApart = 5006,         // invariant 6
-  kExits = 5007,              // once placed: every procedure left at its exit node
-  kSSAEdgeOrder = 5008,       // SSA out-edges after the control-flow out-edges, between blocks
-  kOneDefinition = 5009,      // one definition per version
-  kPhiOperands = 5010,        // one operand per control-flow in-edge of the chain's first node
-  kDominance = 5011,          // every use dominated by its definition
-  kUseSets = 5012,            // use sets match the statements
+  kComponents = 5001,       // invariant 1: one component per procedure
+  kEntryAlone = 5002,       // invariant 2: the entry is the only node without in-edges
+  kProcedureOfNode = 5003,  // invariant 3
+  kEntryEdge = 5004,        // invariant 4: one out-edge, to the first block
+  kBranchEdges = 5005,      // invariant 5
+  kCallsApart = 5006,       // invariant 6
+  kExits = 5007,            // once placed: every procedure left at its exit node
+  kSSAEdgeOrder = 5008,     // SSA out-edges after the control-flow out-edges, between blocks
+  kOneDefinition = 5009,    // one definition per version
+  kPhiOperands = 5010,      // one operand per control-flow in-edge of the chain's first node
+  kDominance = 5011,        // every use dominated by its definition
+  kUseSets = 5012,          // use sets match the statements
 };
 
 // A verifier that finds a graph broken everywhere reports this many violations and then only counts.
@@ -62,7 +63,8 @@ struct Place {
 constexpr int kEndOfBlock = 1 << 30;
 
 template <class K, class V>
-using HashMap = std::unordered_map<K, V, std::hash<K>, std::equal_to<K>, ssaopt::ModuleAllocator<std::pair<const K, V>>>;
+using HashMap =
+    std::unordered_map<K, V, std::hash<K>, std::equal_to<K>, ssaopt::ModuleAllocator<std::pair<const K, V>>>;
 
 // A variable read at a node, as one key: the node's creation number beside the variable's address.
 struct Reading {
@@ -75,22 +77,36 @@ struct ReadingHash {
     return std::hash<const void*>()(reading.pVariable) * 31 + reading.node;
   }
 };
-using Readings = std::unordered_set<Reading, ReadingHash, std::equal_to<Reading>, ssaopt::ModuleAllocator<Reading>>;
+using Readings =
+    std::unordered_set<Reading, ReadingHash, std::equal_to<Reading>, ssaopt::ModuleAllocator<Reading>>;
 
-unsigned numberOf(node v) { return v.index(); }
-
-const char* nameOf(const KvCCfgProcedure* pProcedure) {
+std::string nameOf(const KvCCfgProcedure* pProcedure) {
   return pProcedure ? pProcedure->getName().cstring() : "(none)";
 }
 
-unsigned indexOf(const KvCCfgVariable* pVariable) { return static_cast<unsigned>(pVariable->getIndex()); }
+// "version 41 of variable 7", or "variable 7" for a variable without versions.
+std::string variableText(KvCCfgVariable* pVariable) {
+  if (!pVariable) return "no variable";
+  KvCSSAVariable* pVersion = pVariable->isSSAVariable();
+  std::string variable =
+      "variable " + std::to_string(pVersion ? pVersion->getOrigVar()->getIndex() : pVariable->getIndex());
+  return pVersion ? "version " + std::to_string(pVersion->getIndex()) + " of " + variable : variable;
+}
 
 }  // namespace
 
 class KvCControlFlowGraph::Verifier {
 public:
   explicit Verifier(const KvCControlFlowGraph& G)
-      : m_G(G), m_Owner(G, nullptr), m_Pre(G, -1), m_Post(G, -1), m_Reachable(G, false), m_Head(G, nil) {}
+      : m_G(G),
+        m_Alive(G, false),
+        m_Owner(G, nullptr),
+        m_Pre(G, -1),
+        m_Post(G, -1),
+        m_Reachable(G, false),
+        m_Head(G, nil) {
+    for (node v : G.nodes()) m_Alive[v] = true;
+  }
 
   bool run() {
     numberComponents();
@@ -112,7 +128,8 @@ private:
 #if defined(__GNUC__)
   __attribute__((format(printf, 3, 4)))
 #endif
-  void violation(Check check, const char* format, ...) {
+  void
+  violation(Check check, const char* format, ...) {
     if (++m_Violations > kMaxReports) return;
     char text[512];
     std::va_list args;
@@ -120,6 +137,18 @@ private:
     std::vsnprintf(text, sizeof text, format, args);
     va_end(args);
     ssaopt::reportConsistencyFailure(kClassName, check, text);
+  }
+
+  // "node 52 (bb31)", with the name the printer gives the block, or what else the node is.
+  std::string nodeText(node v) const {
+    std::string text = "node " + std::to_string(v.index());
+    if (!m_Alive[v]) return text + " (deleted)";
+    KvCCfgNodeInfo* pInf = m_G.inf(v);
+    if (KvCBasicBlock* pBlock = pInf ? pInf->isBasicBlock() : nullptr)
+      return text + " (bb" + std::to_string(pBlock->getIndex()) + ")";
+    if (pInf && pInf->isEntryNode()) return text + " (the entry of '" + nameOf(pInf->getProcedure()).c_str() + "')";
+    if (pInf && pInf->isExitNode()) return text + " (the exit of '" + nameOf(pInf->getProcedure()).c_str() + "')";
+    return text;
   }
 
   // ---- Invariants 1 to 6, and the exits ----------------------------------------------------------
@@ -133,13 +162,14 @@ private:
       node entry = pProcedure->getEntryNode();
       KvCCfgNodeInfo* pInf = entry ? m_G.inf(entry) : nullptr;
       if (!pInf || !pInf->isEntryNode() || pInf->getProcedure() != pProcedure) {
-        violation(kComponents, "one component per procedure: '%s' has no entry node of its own", nameOf(pProcedure));
+        violation(kComponents, "one component per procedure: '%s' has no entry node of its own",
+                  nameOf(pProcedure).c_str());
         continue;
       }
       KvCCfgProcedure*& owner = ownerOf[static_cast<std::size_t>(component[entry])];
       if (owner)
-        violation(kComponents, "one component per procedure: '%s' and '%s' are connected", nameOf(owner),
-                  nameOf(pProcedure));
+        violation(kComponents, "one component per procedure: '%s' and '%s' are connected", nameOf(owner).c_str(),
+                  nameOf(pProcedure).c_str());
       else
         owner = pProcedure;
     }
@@ -149,8 +179,8 @@ private:
       m_Owner[v] = ownerOf[c];
       if (!ownerOf[c] && !reported[c]) {
         reported[c] = true;
-        violation(kComponents, "one component per procedure: node %u lies in a component without procedure",
-                  numberOf(v));
+        violation(kComponents, "one component per procedure: %s lies in a component without procedure",
+                  nodeText(v).c_str());
       }
     }
   }
@@ -169,33 +199,38 @@ private:
   void checkEntry(const KvCCfgProcedure& procedure, node entry) {
     if (m_G.indeg(entry) != 0)
       violation(kEntryAlone, "the entry is the only node without in-edges: the entry of '%s' has %d in-edges",
-                nameOf(&procedure), m_G.indeg(entry));
+                nameOf(&procedure).c_str(), m_G.indeg(entry));
     if (m_G.outdeg(entry) != 1 || !m_G.getBasicBlock(m_G.target(m_G.first_adj_edge(entry))))
-      violation(kEntryEdge, "the entry has one out-edge, to the first block: the entry of '%s' has %d out-edges",
-                nameOf(&procedure), m_G.outdeg(entry));
+      violation(kEntryEdge,
+                "the entry has one out-edge, to the first block: the entry of '%s' has %d out-edges",
+                nameOf(&procedure).c_str(), m_G.outdeg(entry));
   }
 
   void checkExit(const KvCCfgProcedure& procedure) {
     node exit = procedure.getExitNode();
     KvCCfgNodeInfo* pInf = exit ? m_G.inf(exit) : nullptr;
-    if (!pInf || !pInf->isExitNode() || m_Owner[exit] != &procedure || !m_G.getControlFlowOutEdges(exit).empty())
-      violation(kExits, "every procedure ends at its exit node: '%s' has no exit node of its own", nameOf(&procedure));
+    if (!pInf || !pInf->isExitNode() || m_Owner[exit] != &procedure ||
+        !m_G.getControlFlowOutEdges(exit).empty())
+      violation(kExits, "every procedure ends at its exit node: '%s' has no exit node of its own",
+                nameOf(&procedure).c_str());
   }
 
   void checkNode(node v) {
     KvCCfgNodeInfo* pInf = m_G.inf(v);
     const KvCCfgProcedure* pOwner = m_Owner[v];
     if (!pInf) {
-      violation(kPayloads, "every node carries a payload: node %u carries none", numberOf(v));
+      violation(kPayloads, "every node carries a payload: %s carries none", nodeText(v).c_str());
       return;
     }
     if (!pOwner) return;
     if (pInf->getProcedure() != pOwner)
-      violation(kProcedureOfNode, "a node belongs to the procedure of its component: node %u belongs to '%s', "
-                "its component to '%s'", numberOf(v), nameOf(pInf->getProcedure()), nameOf(pOwner));
+      violation(kProcedureOfNode,
+                "a node belongs to the procedure of its component: %s belongs to '%s', "
+                "its component to '%s'",
+                nodeText(v).c_str(), nameOf(pInf->getProcedure()).c_str(), nameOf(pOwner).c_str());
     if (v != pOwner->getEntryNode() && m_G.getControlFlowInEdges(v).empty())
-      violation(kEntryAlone, "the entry is the only node without in-edges: node %u of '%s' has none too",
-                numberOf(v), nameOf(pOwner));
+      violation(kEntryAlone, "the entry is the only node without in-edges: %s of '%s' has none too",
+                nodeText(v).c_str(), nameOf(pOwner).c_str());
     checkOutEdges(v, pInf->isBasicBlock(), *pOwner);
     if (KvCBasicBlock* pBlock = pInf->isBasicBlock()) checkCalls(v, *pBlock);
   }
@@ -208,19 +243,20 @@ private:
     for (edge e : m_G.out(v)) {
       KvCCfgEdgeInfo* pInfo = m_G.inf(e);
       if (!pInfo) {
-        violation(kPayloads, "every edge carries a payload: edge %u from node %u carries none", e.index(), numberOf(v));
+        violation(kPayloads, "every edge carries a payload: edge %u from %s carries none", e.index(),
+                  nodeText(v).c_str());
         continue;
       }
       if (pInfo->isSSAEdge()) {
         afterSSAEdge = true;
         if (!pBlock || !m_G.getBasicBlock(m_G.target(e)))
-          violation(kSSAEdgeOrder, "SSA edges join blocks: edge %u from node %u to node %u", e.index(), numberOf(v),
-                    numberOf(m_G.target(e)));
+          violation(kSSAEdgeOrder, "SSA edges join blocks: edge %u from %s to %s", e.index(),
+                    nodeText(v).c_str(), nodeText(m_G.target(e)).c_str());
         continue;
       }
       if (afterSSAEdge)
-        violation(kSSAEdgeOrder, "SSA out-edges follow the control-flow out-edges: node %u has edge %u after them",
-                  numberOf(v), e.index());
+        violation(kSSAEdgeOrder, "SSA out-edges follow the control-flow out-edges: %s has edge %u after them",
+                  nodeText(v).c_str(), e.index());
       trueEdges += pInfo->isTrueBranch() != nullptr;
       falseEdges += pInfo->isFalseBranch() != nullptr;
       plainEdges += !pInfo->isTrueBranch() && !pInfo->isFalseBranch();
@@ -228,19 +264,21 @@ private:
     checkBranchEdges(v, pBlock && pBlock->getBranchCond(), trueEdges, falseEdges, plainEdges);
     bool exitsPlaced = m_G.getState().has(GraphFact::ExitsPlaced);
     if (exitsPlaced && v != owner.getExitNode() && trueEdges + falseEdges + plainEdges == 0)
-      violation(kExits, "every procedure ends at its exit node: node %u of '%s' ends it too", numberOf(v),
-                nameOf(&owner));
+      violation(kExits, "every procedure ends at its exit node: %s of '%s' ends it too", nodeText(v).c_str(),
+                nameOf(&owner).c_str());
   }
 
   void checkBranchEdges(node v, bool branching, int trueEdges, int falseEdges, int plainEdges) {
     bool takenRemoved = m_G.getState().has(GraphFact::Propagated);
-    bool holds = branching ? plainEdges == 0 && trueEdges <= 1 && falseEdges <= 1 && trueEdges + falseEdges >= 1 &&
-                                 (takenRemoved || (trueEdges == 1 && falseEdges == 1))
-                           : trueEdges + falseEdges == 0;
+    bool holds = branching
+                     ? plainEdges == 0 && trueEdges <= 1 && falseEdges <= 1 && trueEdges + falseEdges >= 1 &&
+                           (takenRemoved || (trueEdges == 1 && falseEdges == 1))
+                     : trueEdges + falseEdges == 0;
     if (!holds)
-      violation(kBranchEdges, "a block with a condition has a true and a false out-edge, all other control flow is "
-                "plain: node %u has %d true, %d false and %d plain out-edges%s", numberOf(v), trueEdges, falseEdges,
-                plainEdges, branching ? "" : " and no condition");
+      violation(kBranchEdges,
+                "a block with a condition has a true and a false out-edge, all other control flow is "
+                "plain: %s has %d true, %d false and %d plain out-edges%s",
+                nodeText(v).c_str(), trueEdges, falseEdges, plainEdges, branching ? "" : " and no condition");
   }
 
   void checkCalls(node v, const KvCBasicBlock& block) {
@@ -249,11 +287,11 @@ private:
       if (!pCall) continue;
       const KvCCfgProcedure* pCallee = m_G.findProcedure(pCall->getName());
       if (!pCallee)
-        violation(kCallsApart, "a call names a procedure of the graph: node %u calls '%s'", numberOf(v),
+        violation(kCallsApart, "a call names a procedure of the graph: %s calls '%s'", nodeText(v).c_str(),
                   pCall->getName().cstring());
       else if (pCallee != m_Owner[v] && m_Owner[pCallee->getEntryNode()] == m_Owner[v])
-        violation(kCallsApart, "the calling block does not connect to the callee: node %u calls '%s'", numberOf(v),
-                  nameOf(pCallee));
+        violation(kCallsApart, "the calling block does not connect to the callee: %s calls '%s'",
+                  nodeText(v).c_str(), nameOf(pCallee).c_str());
     }
   }
 
@@ -283,14 +321,15 @@ private:
 
   void define(KvCCfgVariable* pVariable, Place place) {
     if (!pVariable || !pVariable->isSSAVariable()) {
-      violation(kOneDefinition, "every definition defines a version: node %u defines %s", numberOf(place.at),
-                pVariable ? "a variable without version" : "nothing");
+      violation(kOneDefinition, "every definition defines a version: %s defines %s",
+                nodeText(place.at).c_str(), pVariable ? "a variable without version" : "nothing");
       return;
     }
     auto inserted = m_Definitions.emplace(pVariable, place);
     if (!inserted.second)
-      violation(kOneDefinition, "one definition per version: version %u is defined at node %u and at node %u",
-                indexOf(pVariable), numberOf(inserted.first->second.at), numberOf(place.at));
+      violation(kOneDefinition, "one definition per version: %s is defined at %s and at %s",
+                variableText(pVariable).c_str(), nodeText(inserted.first->second.at).c_str(),
+                nodeText(place.at).c_str());
   }
 
   // Every piece of a chain of one-phi blocks has the piece before it as its only predecessor, so a
@@ -373,9 +412,11 @@ private:
     for (KvCPhiFunction* pPhi : block.getPhiFunctions()) {
       array<KvCCfgVariable*> operands = pPhi->getReplacementVariables();
       if (operands.size() != in.size()) {
-        violation(kPhiOperands, "a phi function has one operand per control-flow in-edge: the phi function of "
-                  "version %u at node %u has %zu operands for %zu in-edges of node %u", indexOf(pPhi->getVariable()),
-                  numberOf(v), operands.size(), in.size(), numberOf(m_Head[v]));
+        violation(kPhiOperands,
+                  "a phi function has one operand per control-flow in-edge: the phi function of "
+                  "%s at %s has %zu operands for %zu in-edges of %s",
+                  variableText(pPhi->getVariable()).c_str(), nodeText(v).c_str(), operands.size(), in.size(),
+                  nodeText(m_Head[v]).c_str());
         continue;
       }
       for (std::size_t i = 0; i < operands.size(); ++i)
@@ -388,12 +429,15 @@ private:
     for (const auto& argument : param.getArguments()) {
       auto site = m_CallSites.find(argument.first);
       if (site == m_CallSites.end()) {
-        violation(kDominance, "every argument belongs to a call of the graph: the parameter of version %u keeps one "
-                  "of a call that is gone", indexOf(param.getVariable()));
+        violation(kDominance,
+                  "every argument belongs to a call of the graph: the parameter of %s keeps one "
+                  "of a call that is gone",
+                  variableText(param.getVariable()).c_str());
         continue;
       }
       if (argument.second)
-        for (KvCCfgVariable* pRead : argument.second->getUsedVariables()) requireDominated(pRead, site->second);
+        for (KvCCfgVariable* pRead : argument.second->getUsedVariables())
+          requireDominated(pRead, site->second);
     }
   }
 
@@ -401,7 +445,8 @@ private:
   void checkValueReturn(node v, const KvCCfgValueReturnStatement& valueReturn) {
     auto callee = m_CalleeOfReturn.find(&valueReturn);
     if (callee == m_CalleeOfReturn.end()) {
-      violation(kDominance, "every value return belongs to a procedure: node %u holds one that none lists", numberOf(v));
+      violation(kDominance, "every value return belongs to a procedure: %s holds one that none lists",
+                nodeText(v).c_str());
       return;
     }
     for (KvCCfgVariable* pRead : valueReturn.getUsedVariables())
@@ -410,27 +455,32 @@ private:
 
   void requireDominated(KvCCfgVariable* pRead, Place use) {
     if (!pRead || !pRead->isSSAVariable()) {
-      violation(kDominance, "every use reads a version: node %u reads %s", numberOf(use.at),
+      violation(kDominance, "every use reads a version: %s reads %s", nodeText(use.at).c_str(),
                 pRead ? "a variable without version" : "nothing");
       return;
     }
     auto definition = m_Definitions.find(pRead);
     if (definition == m_Definitions.end()) {
-      violation(kDominance, "every use is dominated by its definition: node %u reads version %u, which nothing "
-                "defines", numberOf(use.at), indexOf(pRead));
+      violation(kDominance,
+                "every use is dominated by its definition: %s reads %s, which nothing "
+                "defines",
+                nodeText(use.at).c_str(), variableText(pRead).c_str());
       return;
     }
     Place def = definition->second;
     if (!use.at || !m_Reachable[use.at]) return;
     if (m_Owner[def.at] != m_Owner[use.at]) {
-      violation(kDominance, "every use is dominated by its definition: node %u of '%s' reads version %u of '%s'",
-                numberOf(use.at), nameOf(m_Owner[use.at]), indexOf(pRead), nameOf(m_Owner[def.at]));
+      violation(kDominance, "every use is dominated by its definition: %s of '%s' reads %s of '%s'",
+                nodeText(use.at).c_str(), nameOf(m_Owner[use.at]).c_str(), variableText(pRead).c_str(),
+                nameOf(m_Owner[def.at]).c_str());
       return;
     }
     bool holds = def.at == use.at ? def.position < use.position : dominates(def.at, use.at);
     if (!holds)
-      violation(kDominance, "every use is dominated by its definition: node %u reads version %u, defined at node %u, "
-                "which does not dominate it", numberOf(use.at), indexOf(pRead), numberOf(def.at));
+      violation(kDominance,
+                "every use is dominated by its definition: %s reads %s, defined at %s, "
+                "which does not dominate it",
+                nodeText(use.at).c_str(), variableText(pRead).c_str(), nodeText(def.at).c_str());
   }
 
   // ---- Use sets ----------------------------------------------------------------------------------
@@ -455,23 +505,27 @@ private:
 
   static void insertDefinedVariables(const KvCBasicBlock& block, ssaopt::set<KvCCfgVariable*>& into) {
     for (KvCPhiFunction* pPhi : block.getPhiFunctions()) into.insert(pPhi->getVariable());
-    for (KvCCfgStatement* pStatement : block.getStatementSeq()) ssaopt::insertAll(into, pStatement->getDefinedVariables());
+    for (KvCCfgStatement* pStatement : block.getStatementSeq())
+      ssaopt::insertAll(into, pStatement->getDefinedVariables());
   }
 
-  void checkUseSetOf(const KvCCfgVariable& variable, const Readings& readings, int readers) {
+  void checkUseSetOf(KvCCfgVariable& variable, const Readings& readings, int readers) {
     for (node user : variable.getUses())
       if (!readings.count({&variable, user.index()})) {
-        violation(kUseSets, "use sets match the statements: the use set of variable %u names node %u, which does "
-                  "not read it", indexOf(&variable), numberOf(user));
+        violation(kUseSets,
+                  "use sets match the statements: the use set of %s names %s, which does "
+                  "not read it",
+                  variableText(&variable).c_str(), nodeText(user).c_str());
         return;
       }
     if (variable.countUses() != readers)
-      violation(kUseSets, "use sets match the statements: the use set of variable %u names %d nodes, %d read it",
-                indexOf(&variable), variable.countUses(), readers);
+      violation(kUseSets, "use sets match the statements: the use set of %s names %d nodes, %d read it",
+                variableText(&variable).c_str(), variable.countUses(), readers);
   }
 
   const KvCControlFlowGraph& m_G;
   int m_Violations = 0;
+  node_array<bool> m_Alive;                    // use sets may name nodes that are gone
   node_array<const KvCCfgProcedure*> m_Owner;  // the procedure of the node's component
   node_array<int> m_Pre, m_Post;               // numbers in the dominator tree
   node_array<bool> m_Reachable;                // from the entry of its procedure

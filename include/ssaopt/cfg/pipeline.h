@@ -68,9 +68,11 @@ public:
   virtual void runStep(const PipelineStep& step, KvCControlFlowGraph& graph) { step.run(graph); }
 };
 
-// Runs the steps in order, each through `client`. A step that the graph is not ready for is reported
-// as an internal error that names it and what is missing, and the pipeline stops there with the graph
-// as the steps before left it; the result is then false.
+// Runs the steps in order, each through `client`. A step whose contract the graph's state does not
+// meet is reported as an internal error that names it and what is missing, and the pipeline stops
+// there with the graph as the steps before left it; the result is then false. (What a step needs
+// beyond its contract, such as every call registered before the SSA transformation, the step itself
+// checks and reports.)
 bool runPipeline(KvCControlFlowGraph& graph, const Pipeline& pipeline, PipelineClient& client);
 bool runPipeline(KvCControlFlowGraph& graph, const Pipeline& pipeline);
 

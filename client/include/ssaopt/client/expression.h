@@ -65,6 +65,9 @@ public:
   bool generatesSameCodeAs(const KvCCfgSFExpression& other) const;
   // The element write a[i] = e, whose last term names the array.
   bool isElementWrite() const;
+  // The number of the literal that the expression stores, as a whole or as the value of an element
+  // write; null where it stores anything else.
+  double* storedLiteral();
 
 private:
   friend class ssaopt::client::ExpressionStore;
