@@ -19,11 +19,6 @@ using ssaopt::edge;
 using ssaopt::nil;
 using ssaopt::node;
 
-bool KvCControlFlowGraph::isControlFlowEdge(edge e) const {
-  KvCCfgEdgeInfo* pInfo = inf(e);
-  return !pInfo || !pInfo->isSSAEdge();
-}
-
 array<edge> KvCControlFlowGraph::getControlFlowOutEdges(node v) const {
   array<edge> edges;
   for (edge e : out(v))

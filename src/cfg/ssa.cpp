@@ -5,8 +5,8 @@
 //            B [x2 = 1];  C [x3 = 2];  D [x4 = phi(x2, x3); y2 = x4] -> [output y2] -> X
 //   (y an output variable; operand i of a phi function belongs to the i-th in-edge of its block)
 //
-// Needs: one entry node per procedure, exit nodes placed, every call registered with the procedure
-// it calls.
+// Needs: one entry node per procedure, exit nodes placed, the start node set, every call registered
+// with the procedure it calls (transformToSSAForm refuses a graph without them).
 #include <cstddef>
 
 #include "ssaopt/cfg/control_flow_graph.h"

@@ -7,7 +7,9 @@
 //   removeUnusedVarDefs (c.1 and y.1 erasable):
 //            z.1 = 3 * x.0; if (1) ...
 //
-// Needs the values of sparse conditional constant propagation, and for the removal divided blocks.
+// Replacing needs the values of sparse conditional constant propagation to find anything. The removal
+// needs SSA form (before it, what call arguments read is read by no block) and takes definitions only
+// from blocks that hold them alone, as dividing leaves every block.
 // What replacing and folding mean is the expressions' business; this file only decides which
 // expressions are asked, and in which order.
 #include "ssaopt/cfg/control_flow_graph.h"

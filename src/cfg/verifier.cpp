@@ -215,6 +215,12 @@ private:
                 nameOf(&procedure).c_str());
   }
 
+  bool hasControlFlowInEdge(node v) const {
+    for (edge e : m_G.in(v))
+      if (m_G.isControlFlowEdge(e)) return true;
+    return false;
+  }
+
   void checkNode(node v) {
     KvCCfgNodeInfo* pInf = m_G.inf(v);
     const KvCCfgProcedure* pOwner = m_Owner[v];
@@ -228,7 +234,7 @@ private:
                 "a node belongs to the procedure of its component: %s belongs to '%s', "
                 "its component to '%s'",
                 nodeText(v).c_str(), nameOf(pInf->getProcedure()).c_str(), nameOf(pOwner).c_str());
-    if (v != pOwner->getEntryNode() && m_G.getControlFlowInEdges(v).empty())
+    if (v != pOwner->getEntryNode() && !hasControlFlowInEdge(v))
       violation(kEntryAlone, "the entry is the only node without in-edges: %s of '%s' has none too",
                 nodeText(v).c_str(), nameOf(pOwner).c_str());
     checkOutEdges(v, pInf->isBasicBlock(), *pOwner);

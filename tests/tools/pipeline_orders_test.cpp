@@ -258,6 +258,15 @@ TEST(PassOrderFuzzing, RandomLegalOrdersKeepBehaviourAndVerify) {
   EXPECT_NE(result.out.find("fuzz: 40 programs, 0 failures"), std::string::npos) << result.out;
 }
 
+TEST(PassOrderFuzzing, RandomOrdersBelongToTheFuzzCommandAlone) {
+  for (const char* arguments : {"generate --random-passes", "fuzz --random-passes --passes=ssa",
+                                "--random-passes x.ssa"}) {
+    tooltest::Result result = tooltest::ssaopt(arguments);
+    EXPECT_EQ(result.status, 2) << arguments;
+    EXPECT_NE(result.err.find("--random-passes"), std::string::npos) << result.err;
+  }
+}
+
 TEST(PassOrderFuzzing, TheSameSeedDrawsTheSameLegalOrder) {
   for (std::uint64_t seed : {1u, 2u, 77u}) {
     std::vector<std::string> pipeline = ssaopt::tool::randomLegalPipeline(seed, 16);

@@ -94,7 +94,10 @@ public:
   // ---- Reading the graph back (reading.cpp) ----------------------------------------------------
 
   // Whether `e` is control flow: not an SSA edge.
-  bool isControlFlowEdge(ssaopt::edge e) const;
+  bool isControlFlowEdge(ssaopt::edge e) const {
+    KvCCfgEdgeInfo* pInfo = inf(e);
+    return !pInfo || !pInfo->isSSAEdge();
+  }
   // The control-flow out-edges and in-edges of `v`, in adjacency order.
   ssaopt::array<ssaopt::edge> getControlFlowOutEdges(ssaopt::node v) const;
   ssaopt::array<ssaopt::edge> getControlFlowInEdges(ssaopt::node v) const;
