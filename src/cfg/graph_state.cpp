@@ -15,8 +15,7 @@ using Op = GraphOperation;
 // ---- Why each step puts its conditions -----------------------------------------------------------
 
 constexpr FactCondition kMakeProcedureAndCall[] = {
-    {Fact::ExitsPlaced, false,
-     "the new procedure would have no exit node and its region would reach the old one's"},
+    {Fact::ExitsPlaced, false, "its region would take the exit node of the procedure it leaves"},
 };
 constexpr FactCondition kSetParametersOfCall[] = {
     {Fact::SSAForm, false, "parameter statements are placed by the SSA transformation"},
@@ -46,7 +45,8 @@ constexpr FactCondition kCompleteCallLists[] = {
     {Fact::SSAForm, false, "the SSA transformation has read the call lists"},
 };
 constexpr FactCondition kTransformToSSAForm[] = {
-    {Fact::ExitsPlaced, true, "the output statements and value returns are placed at the exit nodes"},
+    {Fact::ExitsPlaced, true,
+     "output statements go before the exit of \"#main\", value returns read what callees leave at theirs"},
     {Fact::SSAForm, false, "a second run would give the versions versions of their own"},
 };
 constexpr FactCondition kPlacePhiFunction[] = {
