@@ -133,10 +133,10 @@ bool KvCCfgSFExpression::isElementWrite() const {
 
 // The value of an element write is the complete sub-expression right before it; one that ends in a
 // literal is that literal.
-double* KvCCfgSFExpression::storedLiteral() {
-  bool elementWrite = isElementWrite();
-  if (m_Terms.size() != 1 && !(elementWrite && m_Terms.size() >= 3)) return nullptr;
-  Term& value = m_Terms[elementWrite ? m_Terms.size() - 2 : 0];
+double* KvCCfgSFExpression::storedLiteral(Terms& terms) {
+  bool elementWrite = !terms.empty() && terms.back().op == TermOp::ElementWrite;
+  if (terms.size() != 1 && !(elementWrite && terms.size() >= 3)) return nullptr;
+  Term& value = terms[elementWrite ? terms.size() - 2 : 0];
   return value.op == TermOp::Literal ? &value.number : nullptr;
 }
 

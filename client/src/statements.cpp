@@ -21,19 +21,29 @@ KvCCfgStatement* KvCCfgSFAssignment::clone() const {
   return new KvCCfgSFAssignment(getLHS(), pRHS ? pRHS->clone() : nullptr);
 }
 
-// A folded value that the variable cannot hold becomes the value the store leaves, which the textual
-// format can hold (its front end rejects a literal that does not fit), where storing that stores the
-// same: not where the cast wraps a value past a saturation limit (-1 into a uint32 saturated at 20
-// stores 4294967295, which stored again is 20).
+namespace {
+
+// Whether `folded` can stand in the text, where the front end rejects a stored literal that does not
+// fit its variable. Such a literal becomes the value the store leaves, which stores the same, except
+// where the cast wraps a value past a saturation limit (-1 into a uint32 saturated at 20 stores
+// 4294967295, which stored again is 20): the assignment then keeps the computation unfolded.
+bool fitsTheText(KvCCfgSFExpression::Terms& folded, KvCCfgSFVariable* pVariable) {
+  double* pLiteral = KvCCfgSFExpression::storedLiteral(folded);
+  if (!pLiteral || !pVariable || ssaopt::client::detail::variableHolds(*pVariable, *pLiteral)) return true;
+  double stored = ssaopt::client::storedValue(*pVariable, *pLiteral);
+  if (ssaopt::client::storedValue(*pVariable, stored) != stored) return false;
+  *pLiteral = stored;
+  return true;
+}
+
+}  // namespace
+
 void KvCCfgSFAssignment::foldConstants() {
   KvCCfgSFExpression* pRHS = getSFRHS();
   if (!pRHS) return;
-  pRHS->foldConstants();
-  double* pLiteral = pRHS->storedLiteral();
+  KvCCfgSFExpression::Terms folded = pRHS->foldedTerms();
   KvCCfgSFVariable* pVariable = getLHS() ? ssaopt::client::originalOf(getLHS())->isSFVariable() : nullptr;
-  if (!pLiteral || !pVariable || ssaopt::client::detail::variableHolds(*pVariable, *pLiteral)) return;
-  double stored = ssaopt::client::storedValue(*pVariable, *pLiteral);
-  if (ssaopt::client::storedValue(*pVariable, stored) == stored) *pLiteral = stored;
+  if (fitsTheText(folded, pVariable)) pRHS->setTerms(std::move(folded));
 }
 
 bool KvCCfgSFAssignment::generatesSameCode(KvCCfgStatement* pOther) const {
