@@ -9,7 +9,7 @@
 #include <string>
 
 #include "bench_session.h"
-#include "passes.h"
+#include "ssaopt/cfg/pipeline.h"
 
 namespace {
 
@@ -33,7 +33,7 @@ int main(int argc, char** argv) {
   benchmark::AddCustomContext("ssaopt_build_type", SSAOPT_BUILD_TYPE);
   benchmark::AddCustomContext("processor", processorModel());
   std::string steps;
-  for (const std::string& step : ssaopt::tool::defaultPipeline()) steps += (steps.empty() ? "" : " ") + step;
+  for (const ssaopt::PipelineStep* pStep : ssaopt::typicalRun()) steps += (steps.empty() ? "" : " ") + std::string(pStep->name);
   benchmark::AddCustomContext("pipeline_steps", steps);
   ssaopt::bench::registerPipelineBenchmarks();
   ssaopt::bench::registerDominatorBenchmarks();

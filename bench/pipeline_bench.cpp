@@ -1,12 +1,12 @@
-// Building the graph through the client, and the default pipeline with the time of each step.
+// Building the graph through the client, and the library's typical run with the time of each step.
 #include <benchmark/benchmark.h>
 
 #include <map>
 #include <string>
 
 #include "bench_session.h"
-#include "passes.h"
 #include "ssaopt/cfg/control_flow_graph.h"
+#include "ssaopt/client/pipeline.h"
 #include "ssaopt/ir/node_info.h"
 
 namespace ssaopt::bench {
@@ -45,6 +45,30 @@ std::size_t countStatements(const KvCControlFlowGraph& graph) {
   return count;
 }
 
+// The client's part in every step, timed with the library's; the statements and phi functions right
+// after SSA form are counted (outside the time).
+class TimedSteps : public client::ProgramSteps {
+public:
+  TimedSteps(client::Program& program, std::map<std::string, double>& stepNanoseconds)
+      : client::ProgramSteps(program), m_StepNanoseconds(stepNanoseconds) {}
+
+  void runStep(const PipelineStep& step, KvCControlFlowGraph& graph) override {
+    double start = threadSeconds();
+    client::ProgramSteps::runStep(step, graph);
+    double stepSeconds = threadSeconds() - start;
+    m_StepNanoseconds[step.name] += stepSeconds * kNanoseconds;
+    m_Seconds += stepSeconds;
+    if (step.operation == GraphOperation::TransformToSSAForm) m_SSAStatements = countStatements(graph);
+  }
+  double seconds() const { return m_Seconds; }
+  std::size_t ssaStatements() const { return m_SSAStatements; }
+
+private:
+  std::map<std::string, double>& m_StepNanoseconds;
+  double m_Seconds = 0;
+  std::size_t m_SSAStatements = 0;
+};
+
 // Counters: ns_per_stmt for the whole pipeline and STEP_ns_per_stmt for each step, and the peak of
 // building and running the pipeline together, peak_bytes_per_stmt; ssa_stmts, the statements and phi
 // functions right after SSA form, with ns_per_ssa_stmt and peak_bytes_per_ssa_stmt per each of them.
@@ -56,15 +80,10 @@ void runPipeline(benchmark::State& state, Shape shape, std::size_t statements) {
   for (auto _ : state) {
     Session session;
     session.load(text);
-    double seconds = 0;
-    for (const std::string& step : tool::defaultPipeline()) {
-      double start = threadSeconds();
-      tool::findPass(step)->run(session.program());
-      double stepSeconds = threadSeconds() - start;
-      stepNanoseconds[step] += stepSeconds * kNanoseconds;
-      seconds += stepSeconds;
-      if (step == "ssa") ssaStatements = countStatements(session.program().graph());
-    }
+    TimedSteps steps(session.program(), stepNanoseconds);
+    runTypicalRun(session.program().graph(), steps);
+    double seconds = steps.seconds();
+    ssaStatements = steps.ssaStatements();
     state.SetIterationTime(seconds);
     nanoseconds += seconds * kNanoseconds;
     peakBytes += static_cast<double>(session.peakBytes());

@@ -396,12 +396,15 @@ private:
 // ---- The steps -----------------------------------------------------------------------------------
 
 void KvCControlFlowGraph::propagateSparseConditionalConstant(bool removeDeadCode) {
+  if (!beginStep(ssaopt::GraphOperation::PropagateSparseConditionalConstant)) return;
   addSSAEdges();
   sparseConditionalConstant(removeDeadCode);
+  endStep(ssaopt::GraphOperation::PropagateSparseConditionalConstant);
 }
 
 // Adding edges leaves the node list alone, so the live view serves.
 void KvCControlFlowGraph::addSSAEdges() {
+  if (!beginStep(ssaopt::GraphOperation::AddSSAEdges)) return;
   buildVarUses();
   for (node v : nodes()) {
     KvCCfgNodeInfo* pInf = inf(v);
@@ -409,6 +412,7 @@ void KvCControlFlowGraph::addSSAEdges() {
     for (KvCCfgVariable* pVariable : pInf->getAssignedVariables())
       for (node user : pVariable->uses()) new_edge(v, user, new KvCSSAEdge());
   }
+  endStep(ssaopt::GraphOperation::AddSSAEdges);
 }
 
 // Only assigned variables are cleared: a variable that nothing assigns keeps the uses it had.
@@ -422,7 +426,9 @@ void KvCControlFlowGraph::buildVarUses() {
 }
 
 void KvCControlFlowGraph::sparseConditionalConstant(bool removeDeadCode) {
+  if (!beginStep(ssaopt::GraphOperation::SparseConditionalConstant)) return;
   PropagationRun(*this).run(removeDeadCode);
+  endStep(ssaopt::GraphOperation::SparseConditionalConstant);
 }
 
 void KvCControlFlowGraph::initSparseConditionalConstant(node entry, EdgeWorkList& cfgWorkList,

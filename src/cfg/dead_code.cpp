@@ -10,6 +10,7 @@
 
 #include "graph_mechanism.h"
 #include "ssaopt/cfg/control_flow_graph.h"
+#include "ssaopt/ir/procedure.h"
 #include "ssaopt/ir/statement.h"
 #include "ssaopt/ir/variable.h"
 
@@ -20,6 +21,58 @@ using ssaopt::node;
 using ssaopt::cfg::firstCfgOutEdge;
 using ssaopt::cfg::nextCfgOutEdge;
 
+namespace {
+
+// A parameter statement reads what the arguments of all calls of its procedure read; when a dead
+// block takes a call with it, the argument of that call goes (forgetDeletedStatements), and the use
+// sets must no longer name the parameter's node for what only that argument read. So the nodes of
+// the parameters of every procedure whose call dies are noted with what they read before.
+class ParameterReads {
+public:
+  template <class IsDead>
+  void noteCallsIn(const KvCControlFlowGraph& G, const KvCBasicBlock& block, IsDead isDead) {
+    for (KvCCfgStatement* pStatement : block.getStatementSeq())
+      if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall())
+        if (const KvCCfgProcedure* pCallee = G.findProcedure(pCall->getName()))
+          if (m_Callees.insert(pCallee).second) noteParametersOf(G, *pCallee, isDead);
+  }
+
+  void dropGoneReads(const KvCControlFlowGraph& G) {
+    for (auto& noted : m_ReadBefore) {
+      ssaopt::set<KvCCfgVariable*> readNow = G.getBasicBlock(noted.first)->getUsedVariables();
+      for (KvCCfgVariable* pVariable : noted.second)
+        if (!readNow.count(pVariable)) pVariable->delUse(noted.first);
+    }
+  }
+
+private:
+  // The parameter statements stand in the blocks right after the entry, together or one per block
+  // (some emptied by removeUnusedVarDefs). A dead node is not noted: its destruction takes it out of
+  // every use set.
+  template <class IsDead>
+  void noteParametersOf(const KvCControlFlowGraph& G, const KvCCfgProcedure& callee, IsDead isDead) {
+    node entry = callee.getEntryNode();
+    node v = entry && G.outdeg(entry) == 1 ? G.target(G.first_adj_edge(entry)) : node(nil);
+    while (v && holdsParametersOrNothing(G.getBasicBlock(v))) {
+      if (!isDead(v)) m_ReadBefore[v] = G.getBasicBlock(v)->getUsedVariables();
+      ssaopt::array<edge> out = G.getControlFlowOutEdges(v);
+      v = out.size() == 1 ? G.target(out[0]) : node(nil);
+    }
+  }
+
+  static bool holdsParametersOrNothing(const KvCBasicBlock* pBlock) {
+    if (!pBlock || pBlock->getBranchCond() || !pBlock->getPhiFunctions().empty()) return false;
+    for (KvCCfgStatement* pStatement : pBlock->getStatementSeq())
+      if (!pStatement->isParamStatement()) return false;
+    return true;
+  }
+
+  ssaopt::set<const KvCCfgProcedure*> m_Callees;
+  ssaopt::map<node, ssaopt::set<KvCCfgVariable*>> m_ReadBefore;
+};
+
+}  // namespace
+
 class KvCControlFlowGraph::DeadCodeSweep {
 public:
   explicit DeadCodeSweep(KvCControlFlowGraph& G) : m_G(G) {}
@@ -27,11 +80,15 @@ public:
   // Entry and exit nodes stay, reached or not.
   bool isDeadBlock(node v) const { return !m_G.isVisited(v) && m_G.getBasicBlock(v); }
 
-  // A reached phi node that a control-flow edge of `v` leads to, or nil.
+  // A reached phi node that a control-flow edge of `v` leads to, or nil. The first node of a chain
+  // may have lost its phi function to removeUnusedVarDefs while the later ones keep theirs, whose
+  // operands still follow its in-edges.
   node reachedPhiSuccessor(node v) const {
     for (edge e = firstCfgOutEdge(m_G, v); e; e = nextCfgOutEdge(m_G, e)) {
       node t = m_G.target(e);
-      if (m_G.isVisited(t) && phiFunctionAt(t)) return t;
+      if (!m_G.isVisited(t)) continue;
+      for (node link = t; link; link = nextPhiChainLink(link))
+        if (phiFunctionAt(link)) return t;
     }
     return nil;
   }
@@ -41,9 +98,8 @@ public:
   // block with two edges into it loses both operands, not one operand of a live edge.
   void removeDeadOperands(node t) {
     removeDeadInEdges(t);
-    for (node link = t; KvCPhiFunction* pPhi = phiFunctionAt(link); link = nextPhiChainLink(link)) {
-      removeOperands(link, *pPhi);
-    }
+    for (node link = t; link; link = nextPhiChainLink(link))
+      if (KvCPhiFunction* pPhi = phiFunctionAt(link)) removeOperands(link, *pPhi);
   }
 
   // No use set may keep the node, and no payload slot the block.
@@ -82,10 +138,11 @@ private:
 
   // Every phi function of the block that divideBasicBlock cut into the chain starting at t has one
   // operand per in-edge of t. The walk follows only the links it made: a block that held nothing but
-  // phi functions is followed by another join, whose phi functions belong to other edges.
+  // phi functions is followed by another join, whose phi functions belong to other edges. It passes
+  // links that removeUnusedVarDefs emptied.
   node nextPhiChainLink(node link) const {
     edge next = firstCfgOutEdge(m_G, link);
-    return next && m_G.m_DividedBlockLinks[next] ? m_G.target(next) : nil;
+    return next && m_G.isPhiChainLink(next) ? m_G.target(next) : nil;
   }
 
   // In one sweep: the operands that stay move to the front in their order, and the last places go,
@@ -126,14 +183,17 @@ private:
 bool KvCControlFlowGraph::eliminateDeadCode() {
   DeadCodeSweep sweep(*this);
   bool removedOperand = false;
+  ParameterReads parameterReads;
   for (node n : nodes()) {
     if (!sweep.isDeadBlock(n)) continue;
     while (node t = sweep.reachedPhiSuccessor(n)) {
       sweep.removeDeadOperands(t);
       removedOperand = true;
     }
+    parameterReads.noteCallsIn(*this, *getBasicBlock(n), [&sweep](node v) { return sweep.isDeadBlock(v); });
     sweep.destroyDeadBlock(n);
   }
   forgetDeletedStatements();
+  parameterReads.dropGoneReads(*this);
   return removedOperand;
 }

@@ -7,6 +7,7 @@
 //   frontiers: DF(B) = DF(C) = {D}, all others empty
 //
 // Needs: per component one node without in-edges, its entry node, that reaches every other node.
+// Dominance is a matter of control flow: SSA edges, where there are any, take no part.
 #include <algorithm>
 #include <cstddef>
 
@@ -104,8 +105,8 @@ public:
     finishIdoms(first);
   }
 
-  // The immediate dominator of node number `v`, kNoNode for a root and for a node no root reaches.
-  std::uint32_t idomOf(std::uint32_t v) const { return m_Idom[v]; }
+  // The immediate dominator of `v`, nil for a root and for a node that no root reaches.
+  node idomOf(node v) const { return ssaopt::graph::handleOf<node>(m_Idom[v.index()]); }
 
   static constexpr std::uint32_t kNoNode = ssaopt::detail::kNoRecord;
 
@@ -122,8 +123,10 @@ private:
     m_SuccStart.assign(m_Nodes + 1, 0);
     m_PredStart.assign(m_Nodes + 1, 0);
     for (node v : G.nodes()) {
-      m_SuccStart[v.index() + 1] = static_cast<std::uint32_t>(G.outdeg(v));
-      m_PredStart[v.index() + 1] = static_cast<std::uint32_t>(G.indeg(v));
+      for (edge e : G.out(v))
+        if (G.isControlFlowEdge(e)) ++m_SuccStart[v.index() + 1];
+      for (edge e : G.in(v))
+        if (G.isControlFlowEdge(e)) ++m_PredStart[v.index() + 1];
     }
     for (std::size_t v = 0; v < m_Nodes; ++v) {
       m_SuccStart[v + 1] += m_SuccStart[v];
@@ -133,9 +136,11 @@ private:
     m_Pred.resize(m_PredStart[m_Nodes]);
     for (node v : G.nodes()) {
       std::uint32_t i = m_SuccStart[v.index()];
-      for (edge e : G.out(v)) m_Succ[i++] = G.target(e).index();
+      for (edge e : G.out(v))
+        if (G.isControlFlowEdge(e)) m_Succ[i++] = G.target(e).index();
       i = m_PredStart[v.index()];
-      for (edge e : G.in(v)) m_Pred[i++] = G.source(e).index();
+      for (edge e : G.in(v))
+        if (G.isControlFlowEdge(e)) m_Pred[i++] = G.source(e).index();
     }
   }
 
@@ -274,18 +279,20 @@ private:
 void KvCControlFlowGraph::computeAllIdoms() {
   LengauerTarjan dominators(*this);
   for (std::uint32_t root : dominators.rootsOfComponents(*this)) computeIdomsFast(root, dominators);
-  for (node v : nodes()) {
-    KvCCfgNodeInfo* pInf = inf(v);
-    if (!pInf) continue;
-    std::uint32_t idom = dominators.idomOf(v.index());
-    pInf->setIdom(idom == LengauerTarjan::kNoNode ? node() : handleOf<node>(idom));
-  }
+  for (node v : nodes())
+    if (KvCCfgNodeInfo* pInf = inf(v)) pInf->setIdom(dominators.idomOf(v));
+}
+
+void KvCControlFlowGraph::computeControlFlowIdoms(node_array<node>& idom) const {
+  LengauerTarjan dominators(*this);
+  for (std::uint32_t root : dominators.rootsOfComponents(*this)) computeIdomsFast(root, dominators);
+  for (node v : nodes()) idom[v] = dominators.idomOf(v);
 }
 
 // A component without a node free of in-edges (a cycle that nothing enters) is reported and keeps
 // nil as every node's immediate dominator. Having no entry node either, its dominator tree gets no
 // root, and frontiers, phi placement and renaming pass it by.
-void KvCControlFlowGraph::computeIdomsFast(std::uint32_t root, LengauerTarjan& dominators) {
+void KvCControlFlowGraph::computeIdomsFast(std::uint32_t root, LengauerTarjan& dominators) const {
   if (root == LengauerTarjan::kNoNode) {
     reportInternalFault(kLineComponentWithoutRoot);
     return;

@@ -232,23 +232,31 @@ bool KvCControlFlowGraph::checkConsistency() const {
 // ---- Block surgery -------------------------------------------------------------------------------
 
 node KvCControlFlowGraph::splitAtStatement(node v, KvCCfgStatement* pStatement) {
+  if (!beginStep(ssaopt::GraphOperation::SplitBlock)) return v;
   KvCBasicBlock* pBlock =
       requireBasicBlock(*this, v, kLineSplitAtStatementNoPayload, kLineSplitAtStatementNoBlock);
   if (!pBlock) return v;
-  return continueInNewNode(*this, v, pBlock, pBlock->splitAtStatement(pStatement));
+  node w = continueInNewNode(*this, v, pBlock, pBlock->splitAtStatement(pStatement));
+  endStep(ssaopt::GraphOperation::SplitBlock);
+  return w;
 }
 
 node KvCControlFlowGraph::splitAtCondition(node v) {
+  if (!beginStep(ssaopt::GraphOperation::SplitBlock)) return v;
   KvCBasicBlock* pBlock =
       requireBasicBlock(*this, v, kLineSplitAtConditionNoPayload, kLineSplitAtConditionNoBlock);
   if (!pBlock) return v;
-  return continueInNewNode(*this, v, pBlock, pBlock->splitAtCondition());
+  node w = continueInNewNode(*this, v, pBlock, pBlock->splitAtCondition());
+  endStep(ssaopt::GraphOperation::SplitBlock);
+  return w;
 }
 
 void KvCControlFlowGraph::divideBasicBlock() {
+  if (!beginStep(ssaopt::GraphOperation::DivideBasicBlock)) return;
   for (node v : all_nodes())
     if (const KvCBasicBlock* pBlock = getBasicBlock(v))
       replaceByChain(*this, v, *pBlock, m_DividedBlockLinks);
+  endStep(ssaopt::GraphOperation::DivideBasicBlock);
 }
 
 // Every node is passed at most once: a cycle of blocks without a condition (or of procedures calling

@@ -167,6 +167,7 @@ private:
 // deletes the call block it works on (visited then, never again) and the callee's entry and exit,
 // which hold no call: so no node is visited after an inlining deleted it, whatever the node order.
 void KvCControlFlowGraph::inlineProcedures() {
+  if (!beginStep(ssaopt::GraphOperation::InlineProcedures)) return;
   InliningRun run(*this);
   list<node> callBlocks = run.registerCalls(all_nodes());
   for (node v : callBlocks) {
@@ -175,6 +176,7 @@ void KvCControlFlowGraph::inlineProcedures() {
       if (pStatement->isProcedureCall() && inlineProcedureCalls(v, pBlock, run)) break;
   }
   run.settleProcedures();
+  endStep(ssaopt::GraphOperation::InlineProcedures);
 }
 
 // Everything is checked before the first change, so that a call that cannot be inlined leaves the

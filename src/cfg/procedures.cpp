@@ -301,6 +301,7 @@ node KvCControlFlowGraph::demandProcedureEntryNode(const BxCXString& name, KvCCf
 // procedure and changes nothing. Everything else is checked before the first change, so that a
 // refusal leaves the graph as it was.
 KvCCfgProcedureCall* KvCControlFlowGraph::makeProcedureAndCall(node v) {
+  if (!beginStep(ssaopt::GraphOperation::MakeProcedureAndCall)) return nullptr;
   const KvCBasicBlock* pBlock = requireBasicBlock(*this, v, kLineNotABlock, kLineNotABlock);
   if (!pBlock) return nullptr;
   BxCXString name = procedureNameFor(*this, v, *pBlock);
@@ -312,6 +313,7 @@ KvCCfgProcedureCall* KvCControlFlowGraph::makeProcedureAndCall(node v) {
   RegionSplitter splitter(*this);
   if (!splitter.canBeSplitOff(v)) return nullptr;
   splitter.makeSingleEntry(splitter.splitOff(v, name));
+  endStep(ssaopt::GraphOperation::MakeProcedureAndCall);
   return new KvCCfgProcedureCall(name);
 }
 
@@ -322,6 +324,7 @@ KvCCfgProcedureCall* KvCControlFlowGraph::makeProcedureAndCall(node v) {
 // nothing.
 void KvCControlFlowGraph::setParametersOfCall(KvCCfgProcedureCall* pCall, list<KvCCfgVariable*>& formals,
                                               list<KvCCfgExpression*>& arguments) {
+  if (!beginStep(ssaopt::GraphOperation::SetParametersOfCall)) return;
   if (KvCCfgProcedure* pCallee = findProcedure(pCall->getName())) {
     list<KvCCfgParamStatement*> params = pCallee->getParamStatements();
     if (params.empty()) params = declareParameters(*pCallee, formals);
@@ -341,6 +344,7 @@ void KvCControlFlowGraph::setParametersOfCall(KvCCfgProcedureCall* pCall, list<K
 // One exit node per component, joined from every dead end of the component. A procedure that never
 // reaches its end gets an exit node without in-edges.
 void KvCControlFlowGraph::placeExitNodes() {
+  if (!beginStep(ssaopt::GraphOperation::PlaceExitNodes)) return;
   node_array<int> component;
   int count = COMPONENTS(*this, component);
   ssaopt::array<node> exitOf(static_cast<std::size_t>(count));
@@ -353,12 +357,14 @@ void KvCControlFlowGraph::placeExitNodes() {
     inf(exit)->setProcedure(pProcedure);
     pProcedure->setExitNode(exit);
   }
+  endStep(ssaopt::GraphOperation::PlaceExitNodes);
 }
 
 // Every path that ends "#main" passes a block with an undetermined condition that starts the body
 // again or leaves. A body that never reaches its exit gets no such block, as nothing would enter it;
 // without "#main", its first block or its exit node there is nothing to close.
 void KvCControlFlowGraph::placeLoopAroundMain() {
+  if (!beginStep(ssaopt::GraphOperation::PlaceLoopAroundMain)) return;
   KvCCfgProcedure* pMain = findProcedure(kMainProcedureName);
   if (!pMain) return;
   KV_CONSISTENCY_CHECK(outdeg(pMain->getEntryNode()) == 1, "outdeg(EntryNode) == 1", kGraphClass,
@@ -371,6 +377,7 @@ void KvCControlFlowGraph::placeLoopAroundMain() {
   while (edge e = first_in_edge(exit)) move_edge(e, source(e), loop);
   new_edge(loop, first, new KvCCfgTrueBranch());
   new_edge(loop, exit, new KvCCfgFalseBranch());
+  endStep(ssaopt::GraphOperation::PlaceLoopAroundMain);
 }
 
 // ---- The function call graph ---------------------------------------------------------------------

@@ -109,6 +109,7 @@ void placeOnBranch(KvCControlFlowGraph& G, edge e, KvCCfgAssignment* pAssign) {
 // New blocks are placed behind the nodes of the snapshot, so a second run meets only the branches it
 // met before and adds a second layer of assignments.
 void KvCControlFlowGraph::insertValidConditionAssignments() {
+  if (!beginStep(ssaopt::GraphOperation::InsertValidConditionAssignments)) return;
   for (node v : all_nodes()) {
     KvCBasicBlock* pBlock = getBasicBlock(v);
     KvCCfgExpression* pCond = pBlock ? pBlock->getBranchCond() : nullptr;
@@ -131,6 +132,7 @@ void KvCControlFlowGraph::insertValidConditionAssignments() {
     placeOnBranch(*this, onTrue, trueAssign);
     placeOnBranch(*this, onFalse, falseAssign);
   }
+  endStep(ssaopt::GraphOperation::InsertValidConditionAssignments);
 }
 
 // The variable is asked for first; only a condition that is no variable is asked for a comparison.
