@@ -47,9 +47,9 @@ steps.sort(key=lambda step: order.index(step) if step in order else len(order))
 columns = ["build"] + steps + ["pipeline"]
 figures = [v for sizes in rows.values() for row in sizes.values() for v in row.values() if v > 0]
 context = document["context"]
-title = "ns per statement (thread CPU time), %s build, %s, %d cores at %.0f MHz, %s" % (
+title = "ns per statement (thread CPU time), %s build, %s, %d cores at %.0f MHz, load %.1f, %s" % (
     context.get("ssaopt_build_type", "unknown"), context.get("processor", "unknown processor"),
-    context["num_cpus"], context["mhz_per_cpu"], context["date"][:10])
+    context["num_cpus"], context["mhz_per_cpu"], context.get("load_avg", [0])[0], context["date"][:10])
 open(f"{out}/columns", "w").write(" ".join(columns))
 open(f"{out}/shapes", "w").write(" ".join(rows))
 open(f"{out}/title", "w").write(title)
