@@ -65,8 +65,8 @@ Operand number(double constant) { return {nullptr, constant}; }
 
 enum class Op { Copy, Add };
 
-// `a` or `a + b` (a copy ignores `b`): three-address form, as a code generator lowers its
-// expressions, so that no operation recurses.
+// `a` or `a + b` (the `b` of a copy names no variable): three-address form, as a code generator
+// lowers its expressions, so that no operation recurses.
 class Expression : public KvCCfgExpression {
 public:
   Expression(Op op, Operand a, Operand b = number(0.0)) : m_Op(op), m_Operands{a, b} {}
