@@ -52,13 +52,15 @@ public:
   // Declaration order, versions of one variable in their order.
   bool precedes(KvCCfgVariable* a, KvCCfgVariable* b) const;
 
+  // The block that `v` falls into and that nothing else enters, or nil: blocks printed one after the
+  // other as one piece of straight-line code.
+  ssaopt::node continuationOf(ssaopt::node v) const;
 
 private:
   void findHiddenBlocks();
   bool isUntouchedMainLoop(ssaopt::node v) const;
   bool onlyLeadsToTheEnd(ssaopt::node v) const;
   void layOutProcedures();
-  ssaopt::node continuationOf(ssaopt::node v) const;
   bool isShownBlock(ssaopt::node v) const;
   void findNamedBlocksAndCalls();
   void assignLabels(const ProcedureView& procedure);

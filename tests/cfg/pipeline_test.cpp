@@ -1,7 +1,7 @@
 // The library's pipeline without a client: which orders of the named steps can run (walked from the
 // step contracts before anything runs), what a pipeline does when a step is not ready, and the
 // helpers for reading a graph back. Programs through the pipeline are tested with the client
-// (tests/tools/pipeline_orders_test.cpp, tests/golden).
+// (tests/filetests/pipeline, tests/golden).
 #include <gtest/gtest.h>
 
 #include <string>
