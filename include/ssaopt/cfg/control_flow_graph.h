@@ -221,7 +221,7 @@ public:
   void hoistCodeOutOfIfElseBranches();
 
 private:
-  // The specification's private operations stay members; each step's own helpers are functions of
+  // The steps' named private operations are members; each step's further helpers are functions of
   // its source file (src/cfg/), and what a step keeps while it runs is a class of its own, declared
   // here for its access to the graph and defined in the step's source.
   friend class KvCControlFlowGraphTestAccess;
