@@ -1,9 +1,6 @@
 #include "ssaopt/client/variable.h"
 
-#include <algorithm>
 #include <utility>
-
-#include "ssaopt/client/data_types.h"
 
 KvCCfgSFVariable::KvCCfgSFVariable(std::string name, const KV_DataType* pType, std::uint32_t declarationIndex,
                                    ssaopt::client::SourcePos pos)
@@ -28,29 +25,18 @@ KvCCfgVariable* originalOf(KvCCfgVariable* pVariable) {
 
 namespace {
 
-// A scaled variable's stored integer stands for another number, so its type range says nothing about
-// the value; neither does a float type.
-bool typeBoundsTheValue(const KvCCfgVariable& variable) {
-  const KV_DataType* pType = variable.getDataType();
-  return pType && !variable.isScaled() && !isFloatType(pType);
+// The bound of the range every stored value keeps, where it has one.
+std::optional<double> declaredBound(const KvCCfgVariable& variable, bool lower) {
+  KvCCfgValue minimum(eCfgNonConstant), maximum(eCfgNonConstant);
+  variable.fitRange(minimum, maximum);
+  const KvCCfgValue& bound = lower ? minimum : maximum;
+  return bound.isConstant() ? std::optional<double>(bound.getValue()) : std::nullopt;
 }
 
 }  // namespace
 
-std::optional<double> declaredLowerBound(const KvCCfgVariable& variable) {
-  std::optional<double> bound;
-  if (typeBoundsTheValue(variable)) bound = typeMinimum(variable.getDataType());
-  if (variable.isLowerBorderSaturated())
-    bound = bound ? std::max(*bound, variable.getLowerLimit()) : variable.getLowerLimit();
-  return bound;
-}
+std::optional<double> declaredLowerBound(const KvCCfgVariable& variable) { return declaredBound(variable, true); }
 
-std::optional<double> declaredUpperBound(const KvCCfgVariable& variable) {
-  std::optional<double> bound;
-  if (typeBoundsTheValue(variable)) bound = typeMaximum(variable.getDataType());
-  if (variable.isUpperBorderSaturated())
-    bound = bound ? std::min(*bound, variable.getUpperLimit()) : variable.getUpperLimit();
-  return bound;
-}
+std::optional<double> declaredUpperBound(const KvCCfgVariable& variable) { return declaredBound(variable, false); }
 
 }  // namespace ssaopt::client

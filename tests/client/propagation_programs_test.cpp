@@ -233,27 +233,61 @@ TEST_F(Optimisation, TheOperandWalkOfAnInnerJoinStopsAtTheOuterJoin) {
 
 // ---- Ranges --------------------------------------------------------------------------------------
 
-// level is read with its declared range [0, 100]. The regression: int8 narrow = level + 100 cast
-// [100, 200] to [100, -56]; such a range now has no bounds.
-TEST_F(Optimisation, RangesAreSaturatedScaledAndDroppedWhenTheyWrapAroundTheirType) {
+// A range holds every value the variable stores: level is read with its declared range [0, 100], and
+// each line says what storing the values of the right-hand side gives. The regression: each bound was
+// cast alone, so narrow held [100, -56] (then no range) and below [56, -100]; a type that wraps
+// inside the range holds its whole range.
+TEST_F(Optimisation, RangesHoldEveryValueTheVariableStores) {
   std::string printed = optimised(
       "var int16 level volatile saturate(0..100);\n"
-      "var int16 boosted saturate(..150) output = 0;\n"
-      "var int16 half scale(0.5) output = 0;\n"
-      "var int8 narrow output = 0;\n"
-      "var int16 wide output = 0;\n"
+      "var int16 boosted saturate(..150) output = 0;\n"  // [100, 200] clamped at 150
+      "var int16 half scale(0.5) output = 0;\n"          // [0, 33.3] on the scaling's grid
+      "var int16 wide output = 0;\n"                     // [100, 200] within the type
+      "var int8 narrow output = 0;\n"                    // [100, 200] wraps at 128
+      "var int8 shifted output = 0;\n"                   // [200, 300] between two wraps
+      "var int8 clipped saturate(..20) output = 0;\n"    // [0, 200] clamped at 20
+      "var int8 below saturate(..20) output = 0;\n"      // [-200, -100] wraps under the limit
+      "var int8 beyond saturate(..200) output = 0;\n"    // [0, 300]: the limit 200, or wrapped
+      "var bool some output = 0;\n"                      // [-50, 50]: 0 or 1
+      "var bool always output = 0;\n"                    // [1, 101]: 1
       "proc #main {\n"
       "  boosted = level + 100;\n"
       "  half = level / 3;\n"
-      "  narrow = level + 100;\n"
       "  wide = level + 100;\n"
+      "  narrow = level + 100;\n"
+      "  shifted = level + 200;\n"
+      "  clipped = level * 2;\n"
+      "  below = level - 200;\n"
+      "  beyond = level * 3;\n"
+      "  some = level - 50;\n"
+      "  always = level + 1;\n"
       "}\n",
       propagate, true);
-  EXPECT_EQ(lines(printed, "  boosted.3", "  wide.3"),
+  EXPECT_EQ(lines(printed, "  boosted.3", "  always.3"),
             "  boosted.3 = level.1 + 100;  // * in [100, 150]\n"
             "  half.3 = level.1 / 3;  // * in [0, 33.5]\n"
-            "  narrow.3 = level.1 + 100;  // * in [*, *]\n"
-            "  wide.3 = level.1 + 100;  // * in [100, 200]\n");
+            "  wide.3 = level.1 + 100;  // * in [100, 200]\n"
+            "  narrow.3 = level.1 + 100;  // * in [-128, 127]\n"
+            "  shifted.3 = level.1 + 200;  // * in [-56, 44]\n"
+            "  clipped.3 = level.1 * 2;  // * in [0, 20]\n"
+            "  below.3 = level.1 - 200;  // * in [-128, 127]\n"
+            "  beyond.3 = level.1 * 3;  // * in [-128, 200]\n"
+            "  some.3 = level.1 - 50;  // * in [0, 1]\n"
+            "  always.3 = level.1 + 1;  // * in [1, 1]\n");
+}
+
+// The formal holds the argument of either call; the argument a + 1 reaches 32768, which the int16
+// wraps to -32768, so every int16 may arrive. The regression: [-32768, -32768], cast bound by bound,
+// while runs passed 32767 and 15861.
+TEST_F(Optimisation, RegressionAParameterWhoseArgumentsWrapHoldsItsWholeType) {
+  std::string printed = optimised(
+      "var int16 raw volatile;\nvar int16 a = 0;\nvar int16 x = 0;\nvar int32 out output = 0;\n"
+      "proc #main {\n  a = raw;\n  call g(a);\n  call g(a + 1);\n}\n"
+      "proc g(x) {\n  out = x;\n  extern probe uses(x);\n}\n",
+      propagate, true);
+  std::string formal = lines(printed, "  x.5 = param(", "  out.6");
+  EXPECT_NE(formal.find("// * in [-32768, 32767]\n  out.5"), std::string::npos) << formal;
+  EXPECT_NE(formal.find("  out.6 = x.5;  // * in [-32768, 32767]\n"), std::string::npos) << formal;
 }
 
 // ---- Procedures ----------------------------------------------------------------------------------
@@ -276,7 +310,7 @@ TEST_F(Optimisation, ACallLinksTheArgumentAndTheReturnedValueInEitherNameOrder) 
     std::string printed = withoutBlockNumbers(optimised(text, propagate, true));
     EXPECT_EQ(lines(printed, "  p.6", "  m.7"),
               "  p.6 = param(n.5 from " + caller + ":bb#);  // 5 in [5, 5]\n  m.6 = param(m.4 from " +
-                  caller + ":bb#);  // * in [*, *]\n  m.7 = p.6 + 1;  // 6 in [6, 6]\n");
+                  caller + ":bb#);  // * in [-32768, 32767]\n  m.7 = p.6 + 1;  // 6 in [6, 6]\n");
     EXPECT_NE(printed.find("  r.5 = m.5;  // 6 in [6, 6]\n"), std::string::npos) << printed;
     EXPECT_NE(printed.find("  r.3 = return(r.5);  // 6 in [6, 6]\n"), std::string::npos) << printed;
     EXPECT_NE(printed.find("  // to bb#: not executable, to bb#: not executable\n"), std::string::npos);

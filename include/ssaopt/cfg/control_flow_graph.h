@@ -366,7 +366,7 @@ private:
                        ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
                        bool& changed, bool stores);
   template <class Definition>
-  void recordRange(KvCCfgVariable* pVariable, const Definition& definition);
+  void recordRange(KvCCfgVariable* pVariable, const Definition& definition, bool stores);
   void visitPhiFunction(KvCPhiFunction* pPhi, ssaopt::node v, bool& changed);
 
   int countExecutableInEdges(ssaopt::node v) const;
