@@ -25,7 +25,7 @@ TEST(ToolCheck, EveryExampleBehavesTheSameAfterTheDefaultPipeline) {
   for (const char* name : kExamples) {
     Result result = ssaopt("check " + example(name));
     EXPECT_EQ(result.status, 0) << name << "\n" << result.out << result.err;
-    EXPECT_EQ(result.out, "same behaviour on 20 runs\n") << name;
+    EXPECT_EQ(result.out, "same behaviour on 20 runs\npropagated values held on 20 runs\n") << name;
   }
 }
 
@@ -45,7 +45,8 @@ TEST(ToolCheck, RunsThatHitAGuardAreListedAndCountForNothing) {
             "one step\n"
             "input seed 6: the original program is inconclusive in step 1: more than 1000000 statements in "
             "one step\n"
-            "same behaviour on 0 runs, 2 inconclusive\n");
+            "same behaviour on 0 runs, 2 inconclusive\n"
+            "propagated values held on 2 runs\n");
 }
 
 TEST(ToolRun, PrintsTheTraceOfTheProgramAsWritten) {
