@@ -101,6 +101,16 @@ bool captureOutput(const std::string& command, std::string& output) {
   return pclose(pipe.release()) == 0;
 }
 
+// The other process runs with other allocator settings, so that its objects lie elsewhere and in
+// another order: glibc serves blocks of 4 KB and more from mmap instead of the heap, and fills
+// allocated and freed memory with a byte pattern. A result that follows addresses, or reads memory
+// never written, then differs.
+constexpr const char* kOtherAllocator = "GLIBC_TUNABLES=glibc.malloc.mmap_threshold=4096 MALLOC_PERTURB_=165";
+
+// Both processes print the values and ranges too: a front end reads them, and they follow the order
+// in which propagation merged what it found.
+constexpr client::PrintOptions kPrintedResult{true};
+
 // The settings of the runs of each program: the seeds and limits of the behaviour check.
 client::CheckSettings runSettings() {
   client::CheckSettings settings;
@@ -132,7 +142,7 @@ Problem ProgramCheck::findProblem(const std::string& text, bool checkDeterminism
   std::unique_ptr<client::Program> pTransformed = client::loadProgram(text).program;
   Transformation transformation = transform(*pTransformed);
   if (!transformation.reports.empty()) return {ProblemKind::Report, transformation.reports};
-  std::string printed = client::printProgram(*pTransformed);
+  std::string printed = client::printProgram(*pTransformed, kPrintedResult);
   for (const PrintedSource& source : transformation.sources) {
     std::string problem = roundTripProblem(source.text, source.after);
     if (!problem.empty()) return {ProblemKind::RoundTrip, problem};
@@ -169,12 +179,16 @@ Problem ProgramCheck::findDeterminismProblem(const std::string& text, const std:
   TemporaryFile file(text);
   std::string other;
   if (file.path().empty() ||
-      !captureOutput(m_Tool + passesOption() + " " + file.path() + " 2>/dev/null", other))
+      !captureOutput(otherProcessCommand(file.path()) + " 2>/dev/null", other))
     return {ProblemKind::Determinism, "another process could not optimise the program\n"};
   if (other != printed)
     return {ProblemKind::Determinism,
             "another process printed a different result\n" + firstDifference(printed, other)};
   return {};
+}
+
+std::string ProgramCheck::otherProcessCommand(const std::string& path) const {
+  return std::string(kOtherAllocator) + " " + m_Tool + " --show-values" + passesOption() + " " + path;
 }
 
 std::string ProgramCheck::passesOption() const {
@@ -188,7 +202,8 @@ std::string ProgramCheck::reproduceCommand(ProblemKind kind, const std::string& 
     case ProblemKind::Propagation:
       return "ssaopt check " + path + passes;
     case ProblemKind::Determinism:
-      return "for i in 1 2; do ssaopt" + passes + " " + path + " > out$i.ssa; done; cmp out1.ssa out2.ssa";
+      return "ssaopt --show-values" + passes + " " + path + " > out1.ssa; " + kOtherAllocator +
+             " ssaopt --show-values" + passes + " " + path + " > out2.ssa; cmp out1.ssa out2.ssa";
     case ProblemKind::RoundTrip:
       return "ssaopt --print-after-all" + passes + " " + path + " (read back each printed program)";
     default:

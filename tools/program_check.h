@@ -37,8 +37,8 @@ public:
   // reports nothing and leaves a consistent graph after every pass; the program printed after the
   // front end and after every pass before "ssa" reads back as the same text; runs on a few input
   // streams right after each constant propagation agree with what it claims; the program behaves
-  // the same before and after the pipeline on those streams; and another process optimising it
-  // prints the same result.
+  // the same before and after the pipeline on those streams; and another process optimising it under
+  // other allocator settings prints the same result, values and ranges included.
   // The determinism check starts a process, which takes longer than all other checks together, so
   // the caller decides which programs it runs on.
   // Everything the check allocates is freed when it returns: it installs a pool of its own.
@@ -68,6 +68,8 @@ private:
 
   Transformation transform(client::Program& program) const;
   Problem findDeterminismProblem(const std::string& text, const std::string& printed) const;
+  // The command with which the other process optimises the program in file `path`.
+  std::string otherProcessCommand(const std::string& path) const;
 
   std::vector<std::string> m_Pipeline;
   std::string m_Tool;
