@@ -4,6 +4,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iostream>
+#include <new>
 #include <string>
 #include <vector>
 
@@ -63,5 +64,11 @@ int main(int argc, char** argv) {
     std::cout << "ssaopt " << SSAOPT_VERSION << "\n";
     return ssaopt::tool::kSuccess;
   }
-  return dispatch(options);
+  // The one exception anything throws: running out of memory, wherever it happens, ends the run.
+  try {
+    return dispatch(options);
+  } catch (const std::bad_alloc&) {
+    std::cerr << "ssaopt: out of memory\n";
+    return ssaopt::tool::kFailure;
+  }
 }

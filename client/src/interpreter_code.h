@@ -3,6 +3,7 @@
 // the graph, a set or a name.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -20,7 +21,7 @@ inline constexpr std::uint32_t kNoNode = UINT32_MAX;
 // A variable of the program: `length` numbers of the memory from `base`, one for a scalar.
 struct Slot {
   const KvCCfgSFVariable* pVariable;
-  std::uint32_t base;
+  std::size_t base;
   std::uint32_t length;
   bool isArray;
   bool isVolatile;

@@ -249,7 +249,7 @@ private:
   }
 
   // The memory index of element `index` of the array in `slot`; none outside the array.
-  std::optional<std::uint32_t> element(std::uint32_t slot, double index) const {
+  std::optional<std::size_t> element(std::uint32_t slot, double index) const {
     const Slot& array = m_Code.slots[slot];
     std::int32_t i = ssaopt::integerView(index);
     if (i < 0 || static_cast<std::uint32_t>(i) >= array.length) return std::nullopt;
@@ -258,13 +258,13 @@ private:
 
   bool readElement(std::uint32_t slot, double index, double& value) {
     if (m_Code.slots[slot].isVolatile) return input(m_Code.slots[slot], value);
-    std::optional<std::uint32_t> at = element(slot, index);
+    std::optional<std::size_t> at = element(slot, index);
     value = at ? m_Memory[*at] : kElementOutsideArray;
     return true;
   }
 
   void writeElement(std::uint32_t slot, double index, double value) {
-    std::optional<std::uint32_t> at = element(slot, index);
+    std::optional<std::size_t> at = element(slot, index);
     if (at) m_Memory[*at] = storedValue(*m_Code.slots[slot].pVariable, value);
   }
 

@@ -50,7 +50,7 @@ private:
   void allocateSlots() {
     for (const std::unique_ptr<KvCCfgSFVariable>& pVariable : m_Program.variables()) {
       bool isArray = pVariable->isArray();
-      Slot slot{pVariable.get(), static_cast<std::uint32_t>(m_Code.initialMemory.size()),
+      Slot slot{pVariable.get(), m_Code.initialMemory.size(),
                 isArray ? pVariable->getArrayLength() : 1, isArray, pVariable->isVolatile()};
       double initial = storedValue(*pVariable, pVariable->getInitValue()->getValue());
       m_Code.initialMemory.insert(m_Code.initialMemory.end(), slot.length, initial);

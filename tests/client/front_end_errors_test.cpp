@@ -57,7 +57,10 @@ const ErrorCase kErrorCases[] = {
     {"LimitsTheWrongWayRound", "var int16 x saturate(5..3);\nproc #main {}\n",
      "t.ssa:1:13: error: the lower limit 5 is above the upper limit 3"},
     {"ArrayLengthZero", "var int16 a[0];\nproc #main {}\n",
-     "t.ssa:1:13: error: the length of an array must be a whole number from 1 to 2147483647"},
+     "t.ssa:1:13: error: the length of an array must be a whole number from 1 to 1048576"},
+    // Regression: accepted, and running it took more than 14 GB.
+    {"ArrayLengthBeyondTheLimit", "var int16 a[2147483647];\nproc #main {}\n",
+     "t.ssa:1:13: error: the length of an array must be a whole number from 1 to 1048576"},
     {"ArrayAsParameter", "var int16 a[2];\nproc f(a) {}\nproc #main {}\n",
      "t.ssa:2:8: error: the array 'a' cannot be a parameter"},
     // ---- Values that do not fit ----

@@ -231,6 +231,28 @@ TEST_F(Optimisation, TheOperandWalkOfAnInnerJoinStopsAtTheOuterJoin) {
             "  y.3 = x.6;\n");
 }
 
+// A loop whose condition stays true never lets its procedure end: every path to the exit goes with
+// the dead blocks. The regression: the exit node stood apart and the graph failed its consistency
+// check; now the never-taken edge out of the loop leads to the exit, in #main (whose own loop and
+// output statements go) and in a called procedure alike.
+TEST_F(Optimisation, RegressionALoopThatNeverEndsLeavesItsProcedureInOnePiece) {
+  const char* const kLoops[] = {
+      "var int16 y output = 0;\n"
+      "proc #main {\n  y = y + 1;\nspin:\n  if 1 goto spin else end;\n}\n",
+      "var int16 x = 0;\nvar int16 y output = 0;\n"
+      "proc #main {\n  call f();\n}\n"
+      "proc f {\n  y = y + 1;\nspin:\n  if x == 0 goto spin else end;\n}\n"};
+  for (const char* text : kLoops) {
+    ssaopt::client::Program* pProgram = load(text);
+    ASSERT_NE(pProgram, nullptr);
+    toDividedSSA(*pProgram);
+    pProgram->graph().propagateSparseConditionalConstant(true);
+    EXPECT_TRUE(pProgram->graph().checkConsistency()) << text;
+    std::string printed = ssaopt::client::printProgram(*pProgram);
+    EXPECT_NE(printed.find(" goto spin else end;\n}\n"), std::string::npos) << printed;
+  }
+}
+
 // ---- Ranges --------------------------------------------------------------------------------------
 
 // A range holds every value the variable stores: level is read with its declared range [0, 100], and

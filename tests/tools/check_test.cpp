@@ -76,6 +76,23 @@ TEST(ToolRun, ASeedGivesOneTraceBeforeAndAfterThePipeline) {
             eventsOf(asWritten));
 }
 
+// 40 arrays of the largest length are 320 MB of numbers for the interpreter; with 200 MB of address
+// space the run runs out of memory. The regression: an uncaught std::bad_alloc aborted the tool.
+TEST(ToolRun, RunningOutOfMemoryIsOneLineAndStatusOne) {
+#if defined(__SANITIZE_ADDRESS__)
+  GTEST_SKIP() << "AddressSanitizer reserves more address space than the limit this test sets";
+#endif
+  std::string text;
+  for (int i = 0; i < 40; ++i) text += "var int8 a" + std::to_string(i) + "[1048576];\n";
+  std::string path = fileWith("big.ssa", text + "proc #main {}\n");
+  std::string command = "(ulimit -v 200000; " + std::string(SSAOPT_TOOL) + " run " + path + ") >'" +
+                        pathOf("out") + "' 2>'" + pathOf("err") + "'";
+  int status = std::system(command.c_str());
+  EXPECT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 1) << status;
+  EXPECT_EQ(tooltest::contentsOf(pathOf("err")), "ssaopt: out of memory\n");
+  EXPECT_EQ(tooltest::contentsOf(pathOf("out")), "");
+}
+
 TEST(ToolRun, MalformedInputValuesAreAnError) {
   std::string values = fileWith("values", "table 1 2\ntable three\n");
   Result malformed = ssaopt("run " + example("loop") + " --inputs " + values);

@@ -411,6 +411,9 @@ private:
   // a phi operand was removed.
   bool eliminateDeadCode();
   bool isDeadBlock(ssaopt::node v) const;
+  void keepExitsAttached();
+  bool losesEveryInEdge(ssaopt::node v) const;
+  ssaopt::map<KvCCfgProcedure*, ssaopt::edge> firstEdgesIntoDeadCode() const;
   // A reached phi node that a control-flow edge of `v` leads to, or nil.
   ssaopt::node reachedPhiSuccessor(ssaopt::node v) const;
   KvCPhiFunction* phiFunctionAt(ssaopt::node v) const;
