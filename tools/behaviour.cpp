@@ -59,7 +59,8 @@ private:
       if (contradicted || !propagatesConstants(name)) continue;
       client::PropagationReport oracle = client::checkPropagation(*pTransformed, settings);
       contradicted = oracle.violation.has_value();
-      propagation = (contradicted ? "after pass " + name + ", " : "") + client::formatPropagationReport(oracle);
+      propagation =
+          (contradicted ? "after pass " + name + ", " : "") + client::formatPropagationReport(oracle);
     }
     client::CheckReport report = client::checkBehaviour(*pOriginal, *pTransformed, settings);
     m_Out << client::formatReport(report) << propagation;

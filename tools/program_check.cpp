@@ -166,7 +166,8 @@ ProgramCheck::Transformation ProgramCheck::transform(client::Program& program) c
     if (printable) result.sources.push_back({"pass " + name, client::printProgram(program)});
     if (propagatesConstants(name) && result.contradiction.empty()) {
       client::PropagationReport oracle = client::checkPropagation(program, runSettings());
-      if (oracle.violation) result.contradiction = "after pass " + name + ", " + formatPropagationReport(oracle);
+      if (oracle.violation)
+        result.contradiction = "after pass " + name + ", " + formatPropagationReport(oracle);
     }
   }
   std::ostringstream reports;
@@ -178,8 +179,7 @@ ProgramCheck::Transformation ProgramCheck::transform(client::Program& program) c
 Problem ProgramCheck::findDeterminismProblem(const std::string& text, const std::string& printed) const {
   TemporaryFile file(text);
   std::string other;
-  if (file.path().empty() ||
-      !captureOutput(otherProcessCommand(file.path()) + " 2>/dev/null", other))
+  if (file.path().empty() || !captureOutput(otherProcessCommand(file.path()) + " 2>/dev/null", other))
     return {ProblemKind::Determinism, "another process could not optimise the program\n"};
   if (other != printed)
     return {ProblemKind::Determinism,

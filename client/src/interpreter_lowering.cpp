@@ -50,8 +50,8 @@ private:
   void allocateSlots() {
     for (const std::unique_ptr<KvCCfgSFVariable>& pVariable : m_Program.variables()) {
       bool isArray = pVariable->isArray();
-      Slot slot{pVariable.get(), m_Code.initialMemory.size(),
-                isArray ? pVariable->getArrayLength() : 1, isArray, pVariable->isVolatile()};
+      Slot slot{pVariable.get(), m_Code.initialMemory.size(), isArray ? pVariable->getArrayLength() : 1,
+                isArray, pVariable->isVolatile()};
       double initial = storedValue(*pVariable, pVariable->getInitValue()->getValue());
       m_Code.initialMemory.insert(m_Code.initialMemory.end(), slot.length, initial);
       std::uint32_t index = static_cast<std::uint32_t>(m_Code.slots.size());
@@ -72,7 +72,8 @@ private:
   Code lowerExpression(KvCCfgExpression* pExpression) const {
     if (!pExpression) throw Unrunnable("an expression is missing");
     if (KvCCfgSFExpression* pTerms = pExpression->isSFExpression()) return lowerTerms(*pTerms);
-    if (auto* pMembers = dynamic_cast<KvCCfgVariableExpression*>(pExpression)) return lowerMember(*pMembers);
+    if (KvCCfgVariableExpression* pMembers = pExpression->isVariableExpression())
+      return lowerMember(*pMembers);
     KvCCfgValue value = pExpression->evaluate();
     if (!dynamic_cast<KvCCfgValueExpression*>(pExpression) || !value.isConstant())
       throw Unrunnable("an expression has no value");
@@ -106,7 +107,7 @@ private:
 
   // The summaries' parameter statements pass each variable to itself: `formal` keeps its value.
   bool passesItself(std::uint32_t formal, KvCCfgExpression* pArgument) const {
-    auto* pMembers = dynamic_cast<KvCCfgVariableExpression*>(pArgument);
+    KvCCfgVariableExpression* pMembers = pArgument ? pArgument->isVariableExpression() : nullptr;
     if (!pMembers) return false;
     ssaopt::set<KvCCfgVariable*> members = pMembers->getUsedVariables();
     return members.size() == 1 && slotOf(*members.begin()) == formal;
@@ -164,7 +165,8 @@ private:
   // The one variable each kind of statement that computes nothing defines.
   static KvCCfgVariable* definedVariable(KvCCfgStatement& statement) {
     if (KvCPhiFunction* pPhi = statement.isPhiFunction()) return pPhi->getVariable();
-    if (KvCCfgValueReturnStatement* pReturn = statement.isValueReturnStatement()) return pReturn->getVariable();
+    if (KvCCfgValueReturnStatement* pReturn = statement.isValueReturnStatement())
+      return pReturn->getVariable();
     KvCCfgAssignment* pAssignment = statement.isAssignment();
     return pAssignment ? pAssignment->getLHS() : nullptr;
   }

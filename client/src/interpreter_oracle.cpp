@@ -34,12 +34,13 @@ public:
   void defined(KvCCfgVariable& version, double value, std::uint64_t step) override {
     if (m_Broken) return;
     const KvCCfgValue* pValue = version.getValue();
-    std::string holds = m_View.nameOf(&version) + " = " + formatNumber(value);
     if (pValue && pValue->isConstant() && !holdsConstant(*pValue, value))
-      breakFact(step, holds + ", not its propagated constant " + formatNumber(pValue->getValue()));
+      breakFact(step,
+                holds(version, value) + ", not its propagated constant " + formatNumber(pValue->getValue()));
     else if (breaksLowerBound(version.getMinValue(), value) || breaksUpperBound(version.getMaxValue(), value))
-      breakFact(step, holds + ", outside its propagated range [" + detail::valueText(*version.getMinValue()) +
-                          ", " + detail::valueText(*version.getMaxValue()) + "]");
+      breakFact(step, holds(version, value) + ", outside its propagated range [" +
+                          detail::valueText(*version.getMinValue()) + ", " +
+                          detail::valueText(*version.getMaxValue()) + "]");
   }
 
   void branched(ssaopt::node block, bool taken, std::uint64_t step) override {
@@ -64,6 +65,10 @@ public:
   const std::string& fact() const { return m_Fact; }
 
 private:
+  std::string holds(KvCCfgVariable& version, double value) const {
+    return m_View.nameOf(&version) + " = " + formatNumber(value);
+  }
+
   std::string blockName(ssaopt::node block) const {
     const std::string& label = m_View.labelOf(block);
     return label.empty() ? "bb" + std::to_string(m_View.graph().getBasicBlock(block)->getIndex()) : label;

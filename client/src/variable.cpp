@@ -35,8 +35,12 @@ std::optional<double> declaredBound(const KvCCfgVariable& variable, bool lower) 
 
 }  // namespace
 
-std::optional<double> declaredLowerBound(const KvCCfgVariable& variable) { return declaredBound(variable, true); }
+std::optional<double> declaredLowerBound(const KvCCfgVariable& variable) {
+  return declaredBound(variable, true);
+}
 
-std::optional<double> declaredUpperBound(const KvCCfgVariable& variable) { return declaredBound(variable, false); }
+std::optional<double> declaredUpperBound(const KvCCfgVariable& variable) {
+  return declaredBound(variable, false);
+}
 
 }  // namespace ssaopt::client

@@ -55,6 +55,17 @@ void fillWith(list<KvCCfgValue*>& values, const ssaopt::array<KvCCfgVariable*>& 
   for (KvCCfgVariable* pOperand : operands) *slot++ = of(pOperand);
 }
 
+// A parameter statement as its formal holds it once it ran for some call: each argument already
+// stored as the call stores it (KvCCfgParamStatement::evaluateHeld), so the visit stores the result as
+// it is.
+struct HeldByFormal {
+  const KvCCfgParamStatement& statement;
+
+  KvCCfgValue evaluate() const { return statement.evaluateHeld(); }
+  KvCCfgValue getMinimum() const { return statement.getHeldMinimum(); }
+  KvCCfgValue getMaximum() const { return statement.getHeldMaximum(); }
+};
+
 // The value and range of a variable before a visit, to tell whether the visit changed any of them. Bit
 // for bit: -0.0 after +0.0 compares equal as a value of the lattice, yet prints differently.
 class DefinitionSnapshot {
@@ -305,7 +316,8 @@ void KvCControlFlowGraph::visitAssignment(KvCCfgAssignment* pAssignment, node v,
 void KvCControlFlowGraph::visitParamStatement(KvCCfgParamStatement* pStatement, node v,
                                               list<edge>& cfgWorkList, list<edge>& ssaWorkList,
                                               bool& changed) {
-  visitDefinition(pStatement->getVariable(), *pStatement, v, cfgWorkList, ssaWorkList, changed, true);
+  visitDefinition(pStatement->getVariable(), HeldByFormal{*pStatement}, v, cfgWorkList, ssaWorkList, changed,
+                  false);
 }
 
 void KvCControlFlowGraph::visitValueReturnStatement(KvCCfgValueReturnStatement* pStatement, node v,

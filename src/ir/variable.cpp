@@ -75,8 +75,15 @@ KvCSSAVariable* KvCCfgVariable::isSSAVariable() { return nullptr; }
 // Array elements and volatile variables may change behind the analysis' back, so nothing about them
 // is constant; the caller sees that through its argument as well.
 void KvCCfgVariable::setVarValueAndAdjustCfgValue(KvCCfgValue& value) {
-  if (!isNeverConstant()) fitConstant(value);
+  adjustCfgValue(value);
   setVarValue(value);
+}
+
+void KvCCfgVariable::adjustCfgValue(KvCCfgValue& value) const {
+  if (isNeverConstant())
+    value = KvCCfgValue(eCfgNonConstant);
+  else
+    fitConstant(value);
 }
 
 void KvCCfgVariable::setVarValue(KvCCfgValue& value) {

@@ -92,8 +92,8 @@ void castIntegerRange(const IntegerTarget& target, double& minimum, double& maxi
     auto low = static_cast<std::int64_t>(minimum), high = static_cast<std::int64_t>(maximum);
     double wrappedLow = wrapInteger(minimum, target.width, target.isSigned);
     double wrappedHigh = wrapInteger(maximum, target.width, target.isSigned);
-    bool lessThanATurn = static_cast<std::uint64_t>(high) - static_cast<std::uint64_t>(low) <
-                         static_cast<std::uint64_t>(turn);
+    bool lessThanATurn =
+        static_cast<std::uint64_t>(high) - static_cast<std::uint64_t>(low) < static_cast<std::uint64_t>(turn);
     if (lessThanATurn && wrappedLow <= wrappedHigh) {
       minimum = wrappedLow;
       maximum = wrappedHigh;

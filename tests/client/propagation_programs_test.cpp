@@ -332,11 +332,27 @@ TEST_F(Optimisation, ACallLinksTheArgumentAndTheReturnedValueInEitherNameOrder) 
     std::string printed = withoutBlockNumbers(optimised(text, propagate, true));
     EXPECT_EQ(lines(printed, "  p.6", "  m.7"),
               "  p.6 = param(n.5 from " + caller + ":bb#);  // 5 in [5, 5]\n  m.6 = param(m.4 from " +
-                  caller + ":bb#);  // * in [-32768, 32767]\n  m.7 = p.6 + 1;  // 6 in [6, 6]\n");
+                  caller + ":bb#);  // * in [*, *]\n  m.7 = p.6 + 1;  // 6 in [6, 6]\n");
     EXPECT_NE(printed.find("  r.5 = m.5;  // 6 in [6, 6]\n"), std::string::npos) << printed;
     EXPECT_NE(printed.find("  r.3 = return(r.5);  // 6 in [6, 6]\n"), std::string::npos) << printed;
     EXPECT_NE(printed.find("  // to bb#: not executable, to bb#: not executable\n"), std::string::npos);
   }
+}
+
+// show reads level, so the summaries pass level on to it, which stores nothing. The regression:
+// propagation stored the argument's value 65534 again, and the saturation at 20 made it 20, a
+// constant that replace-constants would have put where show reads 65534 (found by the oracle).
+TEST_F(Optimisation, RegressionAVariablePassedOnToAProcedureKeepsTheValueItHolds) {
+  std::string printed = optimised(
+      "var bool on = 1;\n"
+      "var uint16 level saturate(..20) = 1;\n"
+      "proc #main {\n  level = ~on;\n  call show();\n}\n"
+      "proc show {\n  extern probe uses(level);\n}\n",
+      propagate, true);
+  EXPECT_NE(printed.find("  level.3 = ~on.1;  // 65534 in [65534, 65534]\n"), std::string::npos) << printed;
+  EXPECT_NE(printed.find("  level.4 = param(level.3 from #main:bb9);  // 65534 in [65534, 65534]\n"),
+            std::string::npos)
+      << printed;
 }
 
 // ---- Unused definitions --------------------------------------------------------------------------

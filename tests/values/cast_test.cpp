@@ -113,7 +113,7 @@ TEST(CastRange, AnIntegerTypeThatWrapsInsideTheRangeGivesItsWholeRange) {
                 {i32, 0, 2147483648.0, -2147483648.0, 2147483647.0},
                 {i32, -kInfinity, 5, -2147483648.0, 2147483647.0},  // an open end
                 {i32, 1e300, 1e300, -2147483648.0, 2147483647.0},   // beyond the 64-bit view
-                {i16, 5, 3, -32768, 32767},                          // no range at all
+                {i16, 5, 3, -32768, 32767},                         // no range at all
                 {i16, kNaN, 3, -32768, 32767}});
 }
 
@@ -130,8 +130,9 @@ TEST(CastRange, AnIntegerRangeBetweenTwoWrapsKeepsItsWidth) {
 
 TEST(CastRange, BooleansFloatsAndTypesWithoutConversion) {
   const KV_DataType* boolean = KV_DataType::boolean();
-  expectRanges({{boolean, -50, 50, 0, 1}, {boolean, 1, 101, 1, 1}, {boolean, 0, 0, 0, 0}, {boolean, -3, -1, 1, 1}},
-               true);
+  expectRanges(
+      {{boolean, -50, 50, 0, 1}, {boolean, 1, 101, 1, 1}, {boolean, 0, 0, 0, 0}, {boolean, -3, -1, 1, 1}},
+      true);
   expectRanges({{boolean, 250, 260, 0, 255}, {boolean, 3, 5, 3, 5}});  // not normalised: the low byte
   expectRanges({{KV_DataType::float32(), 0.1, 1e39, static_cast<double>(0.1f), kInfinity},
                 {KV_DataType::float64(), -kInfinity, 3, -kInfinity, 3},

@@ -54,6 +54,10 @@ public:
 
   // The current value, still owned by the variable.
   KvCCfgValue* getValue() const { return m_pValue; }
+  // Adjusts `value` in place to what the variable holds once it is stored, storing nothing: the
+  // saturated border, else the scaling's represented value, else the value cast to the data type
+  // (a Boolean becomes 0 or 1); non-constant for an array or volatile variable.
+  void adjustCfgValue(KvCCfgValue& value) const;
   // Adjusts `value` in place to what the variable can hold and stores a copy as the current value.
   // The value object replaced is not deleted: a caller that fetched it with getValue() owns it now.
   void setVarValueAndAdjustCfgValue(KvCCfgValue& value);
