@@ -3,6 +3,7 @@
 // the propagated program must agree with them. A run that does not is a miscompile in waiting, even
 // where no step of the library reads the fact it breaks.
 #include <cmath>
+#include <memory>
 
 #include "program_view.h"
 #include "ssaopt/client/interpreter.h"
@@ -29,7 +30,7 @@ bool holdsConstant(const KvCCfgValue& constant, double value) {
 
 class FactChecker : public RunObserver {
 public:
-  explicit FactChecker(const detail::ProgramView& view) : m_View(view) {}
+  explicit FactChecker(const Program& program) : m_Program(program) {}
 
   void defined(KvCCfgVariable& version, double value, std::uint64_t step) override {
     if (m_Broken) return;
@@ -45,7 +46,7 @@ public:
 
   void branched(ssaopt::node block, bool taken, std::uint64_t step) override {
     if (m_Broken) return;
-    KvCCfgExpression* pCondition = m_View.graph().getBasicBlock(block)->getBranchCond();
+    KvCCfgExpression* pCondition = m_Program.graph().getBasicBlock(block)->getBranchCond();
     KvCCfgValue condition = pCondition->evaluate();
     if (condition.isConstant() && (condition.getValue() != 0.0) != taken)
       breakFact(step, blockName(block) + " goes " + (taken ? "true" : "false") +
@@ -65,13 +66,20 @@ public:
   const std::string& fact() const { return m_Fact; }
 
 private:
-  std::string holds(KvCCfgVariable& version, double value) const {
-    return m_View.nameOf(&version) + " = " + formatNumber(value);
+  std::string holds(KvCCfgVariable& version, double value) {
+    return view().nameOf(&version) + " = " + formatNumber(value);
   }
 
-  std::string blockName(ssaopt::node block) const {
-    const std::string& label = m_View.labelOf(block);
-    return label.empty() ? "bb" + std::to_string(m_View.graph().getBasicBlock(block)->getIndex()) : label;
+  std::string blockName(ssaopt::node block) {
+    const std::string& label = view().labelOf(block);
+    return label.empty() ? "bb" + std::to_string(m_Program.graph().getBasicBlock(block)->getIndex()) : label;
+  }
+
+  // Laying the program out to name its versions and blocks costs more than a run: only a broken fact
+  // needs it.
+  const detail::ProgramView& view() {
+    if (!m_pView) m_pView = std::make_unique<detail::ProgramView>(m_Program);
+    return *m_pView;
   }
 
   void breakFact(std::uint64_t step, std::string fact) {
@@ -80,7 +88,8 @@ private:
     m_Fact = std::move(fact);
   }
 
-  const detail::ProgramView& m_View;
+  const Program& m_Program;
+  std::unique_ptr<detail::ProgramView> m_pView;
   bool m_Broken = false;
   std::uint64_t m_Step = 0;
   std::string m_Fact;
@@ -89,13 +98,12 @@ private:
 }  // namespace
 
 PropagationReport checkPropagation(const Program& program, const CheckSettings& settings) {
-  detail::ProgramView view(program);
   Interpreter interpreter(program);
   PropagationReport report;
   for (std::uint64_t run = 0; run < settings.runs && !report.violation; ++run) {
     std::uint64_t seed = settings.firstSeed + run;
     SeededInputs inputs(seed);
-    FactChecker checker(view);
+    FactChecker checker(program);
     checker.ended(interpreter.run(settings.limits, inputs, &checker));
     if (checker.broken())
       report.violation = PropagationViolation{seed, checker.step(), checker.fact()};
