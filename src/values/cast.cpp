@@ -114,11 +114,11 @@ KvCCfgValue& cast(const KV_DataType* type, KvCCfgValue& v, bool normaliseBool) {
 KvCCfgValue& cast(const KV_DataType* type, KvCCfgValue& v) { return cast(type, v, false); }
 
 void castRange(const KV_DataType* type, double& minimum, double& maximum, bool normaliseBool) {
-  if (!type) return;
   if (!(minimum <= maximum)) {
     minimum = -std::numeric_limits<double>::infinity();
     maximum = std::numeric_limits<double>::infinity();
   }
+  if (!type) return;
   Conversion conversion = conversionOf(*type, normaliseBool);
   switch (conversion.kind) {
     case Conversion::Kind::Keep:

@@ -137,9 +137,10 @@ TEST(CastRange, BooleansFloatsAndTypesWithoutConversion) {
   expectRanges({{KV_DataType::float32(), 0.1, 1e39, static_cast<double>(0.1f), kInfinity},
                 {KV_DataType::float64(), -kInfinity, 3, -kInfinity, 3},
                 {KV_DataType::float64(), 5, 3, -kInfinity, kInfinity}});
-  double minimum = 300, maximum = 200;
+  double minimum = 200, maximum = 300;
   castRange(nullptr, minimum, maximum, true);
-  EXPECT_EQ(minimum, 300);  // no type, nothing to convert
+  EXPECT_EQ(minimum, 200);  // no type, nothing to convert
+  EXPECT_EQ(maximum, 300);
 }
 
 }  // namespace
