@@ -2,7 +2,10 @@
 # Installs the Debian packages the project needs to build and test, when any is missing.
 set -euo pipefail
 
-packages=(g++ cmake ninja-build libgtest-dev libgmock-dev libbenchmark-dev graphviz clang libclang-rt-14-dev)
+# graphviz: the pictures (--emit=dot, the HTML report); chromium: the test that loads the HTML report;
+# valgrind: the install check runs a consumer project under it; doxygen: the API reference.
+packages=(g++ cmake ninja-build libgtest-dev libgmock-dev libbenchmark-dev graphviz chromium clang
+  libclang-rt-14-dev valgrind doxygen)
 
 missing=()
 for package in "${packages[@]}"; do

@@ -109,7 +109,11 @@ constexpr const char* kOtherAllocator = "GLIBC_TUNABLES=glibc.malloc.mmap_thresh
 
 // Both processes print the values and ranges too: a front end reads them, and they follow the order
 // in which propagation merged what it found.
-constexpr client::PrintOptions kPrintedResult{true};
+client::PrintOptions printedResult() {
+  client::PrintOptions options;
+  options.showValues = true;
+  return options;
+}
 
 // The settings of the runs of each program: the seeds and limits of the behaviour check.
 client::CheckSettings runSettings() {
@@ -142,7 +146,7 @@ Problem ProgramCheck::findProblem(const std::string& text, bool checkDeterminism
   std::unique_ptr<client::Program> pTransformed = client::loadProgram(text).program;
   Transformation transformation = transform(*pTransformed);
   if (!transformation.reports.empty()) return {ProblemKind::Report, transformation.reports};
-  std::string printed = client::printProgram(*pTransformed, kPrintedResult);
+  std::string printed = client::printProgram(*pTransformed, printedResult());
   for (const PrintedSource& source : transformation.sources) {
     std::string problem = roundTripProblem(source.text, source.after);
     if (!problem.empty()) return {ProblemKind::RoundTrip, problem};

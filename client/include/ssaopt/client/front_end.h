@@ -19,11 +19,11 @@
 // variable is both volatile and erasable, and every variable an external call may modify is volatile
 // or an array (the library treats external calls as defining nothing).
 //
-// The program is made while a memory controller is installed, and must be destroyed while the same
-// one still is (see program.h).
+// The program is destroyed before the memory pool it was made in ends (see program.h).
 #pragma once
 
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -33,14 +33,20 @@
 namespace ssaopt::client {
 
 struct LoadResult {
-  std::unique_ptr<Program> program;  // null after an error
-  // The warnings, and the error that stopped the front end, in the order found.
+  std::unique_ptr<Program> program;  // null when there are errors
+  // Errors and warnings in the order of their positions, with their source lines. The front end goes
+  // on after an error at the next statement or declaration (after a syntax error it only reads on),
+  // up to DiagnosticList::kMaxErrors errors.
   std::vector<Diagnostic> diagnostics;
 };
 
 LoadResult loadProgram(std::string text);
 
-// Reads the file first; an unreadable file is an error at line 0.
+// The text of the file at `path`, or nothing when it cannot be read. "-" is standard input, read at
+// the first call; later calls give the same text, so a command may load the program twice.
+std::optional<std::string> readSourceText(const std::string& path);
+
+// Reads the file first (see readSourceText); an unreadable file is an error at line 0.
 LoadResult loadProgramFile(const std::string& path);
 
 // Starts the numbering of the library's objects again from 0, so that the program loaded next has the
