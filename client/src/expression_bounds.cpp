@@ -118,14 +118,28 @@ Interval unaryInterval(TermOp op, const Interval& a) {
   }
 }
 
+// Whether the end may be the infinity it leans to: open, or that infinity. An end not known yet is
+// taken as a number, as optimistically as its other uses.
+bool mayBeInfinite(const KvCCfgValue& end) {
+  return end.isNonConstant() || (end.isConstant() && std::isinf(end.getValue()));
+}
+
+// Opposite infinities added give NaN, which lies in no interval: the sum is then bounded nowhere. The
+// ends alone do not show it: [-inf, 0] + [0, inf] has the ends -inf and inf.
+Interval sumInterval(const Interval& a, const Interval& b) {
+  if ((mayBeInfinite(a.lo) && mayBeInfinite(b.hi)) || (mayBeInfinite(a.hi) && mayBeInfinite(b.lo)))
+    return {kUnbounded, kUnbounded};
+  return {boundFrom({a.lo, b.lo}, [&] { return a.lo.getValue() + b.lo.getValue(); }),
+          boundFrom({a.hi, b.hi}, [&] { return a.hi.getValue() + b.hi.getValue(); })};
+}
+
 Interval binaryInterval(TermOp op, const Interval& a, const Interval& b) {
   switch (op) {
     case TermOp::Add:
-      return {boundFrom({a.lo, b.lo}, [&] { return a.lo.getValue() + b.lo.getValue(); }),
-              boundFrom({a.hi, b.hi}, [&] { return a.hi.getValue() + b.hi.getValue(); })};
+      return sumInterval(a, b);
     case TermOp::Subtract:
-      return {boundFrom({a.lo, b.hi}, [&] { return a.lo.getValue() - b.hi.getValue(); }),
-              boundFrom({a.hi, b.lo}, [&] { return a.hi.getValue() - b.lo.getValue(); })};
+      return sumInterval(a, {boundFrom({b.hi}, [&] { return -b.hi.getValue(); }),
+                             boundFrom({b.lo}, [&] { return -b.lo.getValue(); })});
     case TermOp::Multiply:
       return cornerInterval(a, b, [](double x, double y) { return x * y; });
     case TermOp::Divide:

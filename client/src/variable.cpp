@@ -1,5 +1,7 @@
 #include "ssaopt/client/variable.h"
 
+#include <cmath>
+#include <limits>
 #include <utility>
 
 KvCCfgSFVariable::KvCCfgSFVariable(std::string name, const KV_DataType* pType, std::uint32_t declarationIndex,
@@ -25,12 +27,17 @@ KvCCfgVariable* originalOf(KvCCfgVariable* pVariable) {
 
 namespace {
 
-// The bound of the range every stored value keeps, where it has one.
+// The bound of the range every value read keeps, where it has one. A read of a volatile variable is an
+// input, always a number: what storing any number gives (a range bounded by the infinities). Anything
+// else holds what was stored, which may be NaN (an open range).
 std::optional<double> declaredBound(const KvCCfgVariable& variable, bool lower) {
-  KvCCfgValue minimum(eCfgNonConstant), maximum(eCfgNonConstant);
+  constexpr double kInfinity = std::numeric_limits<double>::infinity();
+  KvCCfgValue minimum = variable.isVolatile() ? KvCCfgValue(-kInfinity) : KvCCfgValue(eCfgNonConstant);
+  KvCCfgValue maximum = variable.isVolatile() ? KvCCfgValue(kInfinity) : KvCCfgValue(eCfgNonConstant);
   variable.fitRange(minimum, maximum);
   const KvCCfgValue& bound = lower ? minimum : maximum;
-  return bound.isConstant() ? std::optional<double>(bound.getValue()) : std::nullopt;
+  bool bounds = bound.isConstant() && std::isfinite(bound.getValue());
+  return bounds ? std::optional<double>(bound.getValue()) : std::nullopt;
 }
 
 }  // namespace

@@ -37,6 +37,14 @@ struct Hull {
   }
 };
 
+// An end that bounds with a number: a constant other than NaN.
+bool boundsWithNumber(const KvCCfgValue& end) { return end.isConstant() && !std::isnan(end.getValue()); }
+
+// An end that bounds nothing: undetermined stays undetermined, anything else becomes non-constant.
+KvCCfgValue openEnd(const KvCCfgValue& given) {
+  return given.isUndetermined() ? given : KvCCfgValue(eCfgNonConstant);
+}
+
 // What a fitted end says: an undetermined end still waits for what it depends on, and an infinite end
 // bounds nothing unless the end it came from was a constant (an infinity the values may reach).
 KvCCfgValue fittedEnd(const KvCCfgValue& given, double end) {
@@ -116,6 +124,12 @@ void KvCCfgVariable::setVarRangeAndAdjust(KvCCfgValue& minimum, KvCCfgValue& max
 // values within the borders convert monotonically except where the type wraps, which castRange
 // accounts for. The range held is the hull of the three parts.
 void KvCCfgVariable::fitRange(KvCCfgValue& minimum, KvCCfgValue& maximum) const {
+  if (!boundsWithNumber(minimum) && !boundsWithNumber(maximum) && storesNaN()) {
+    // Values bounded by a number on no side may be NaN, which no saturation clamps and no bound holds.
+    minimum = openEnd(minimum);
+    maximum = openEnd(maximum);
+    return;
+  }
   double lo = endOf(minimum, -kInfinity), hi = endOf(maximum, kInfinity);
   if (!(lo <= hi)) {
     lo = -kInfinity;
@@ -133,6 +147,13 @@ void KvCCfgVariable::fitRange(KvCCfgValue& minimum, KvCCfgValue& maximum) const 
   }
   minimum = fittedEnd(minimum, held.lo);
   maximum = fittedEnd(maximum, held.hi);
+}
+
+// A float or scaled variable keeps a NaN as it is; an integer type makes it 0, a Boolean 1.
+bool KvCCfgVariable::storesNaN() const {
+  KvCCfgValue value(std::numeric_limits<double>::quiet_NaN());
+  fitConstant(value);
+  return std::isnan(value.getValue());
 }
 
 double KvCCfgVariable::saturated(double number) const {

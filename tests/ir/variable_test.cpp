@@ -128,7 +128,14 @@ TEST(SSAVariableRange, BothBoundsAreFittedTogetherAsStoringTheValuesBetweenThemG
   EXPECT_GT(roundedUp, 100.1);
   fitted(s, 0, 200);
   EXPECT_VALUE(*s.getMaxValue(), constant(roundedUp));
-  EXPECT_EQ(fitted(s, nonConstant, nonConstant).rfind("[non-constant, constant 100.2", 0), 0u);
+  EXPECT_EQ(fitted(s, nonConstant, constant(200)).rfind("[non-constant, constant 100.2", 0), 0u);
+  // Values bounded by a number on no side may be NaN, which the scaling keeps and saturation does not
+  // clamp; an integer type stores NaN as 0.
+  EXPECT_EQ(fitted(s, nonConstant, nonConstant), "[non-constant, non-constant]");
+  const double nan = std::numeric_limits<double>::quiet_NaN();
+  EXPECT_EQ(fitted(s, nan, nan), "[non-constant, non-constant]");
+  EXPECT_EQ(fitted(s, undetermined, nonConstant), "[undetermined, non-constant]");
+  EXPECT_EQ(fitted(b, nan, nan), "[constant -128, constant 127]");
 
   TestVariable real;
   KvCSSAVariable r(&real);

@@ -74,8 +74,11 @@ public:
   // two bounds alone would claim too little wherever the type wraps between them. A bound that is
   // not a constant counts as open; an undetermined one stays undetermined, a non-constant one stays
   // non-constant unless the type bounds that side, and an infinite end that was not a constant
-  // becomes non-constant again. With both bounds open it gives the range every value of the
-  // variable (an element of an array, an input) keeps.
+  // becomes non-constant again. Values that may be NaN have no number as a bound on either side
+  // (both bounds open, or the constant NaN): a float or scaled variable keeps a stored NaN, which
+  // saturation leaves alone and no range holds, so such a variable gets no bound then, while a range
+  // bounded by a number on at least one side holds numbers only. With both bounds open it gives the
+  // range every value of the variable (an element of an array) keeps.
   void fitRange(KvCCfgValue& minimum, KvCCfgValue& maximum) const;
   // Fits [minimum, maximum], bounds of the values assigned, in place (fitRange) and makes it the
   // variable's range (setVarRange).
@@ -122,6 +125,8 @@ protected:
 
 private:
   void dropValueToNonConstant();
+  // Whether storing NaN leaves NaN.
+  bool storesNaN() const;
   // What saturation makes of a number beyond a saturated border.
   double saturated(double number) const;
   // Brings a range within the saturated borders to what storing its numbers gives.
