@@ -22,6 +22,10 @@ struct Interval {
 
 const KvCCfgValue kUnbounded(eCfgNonConstant);
 
+// The values of a 32-bit integer, which every integer operator gives.
+constexpr double kInt32Lowest = -2147483648.0;
+constexpr double kInt32Highest = 2147483647.0;
+
 // The bound computed from `inputs`: non-constant if any is, undetermined if any is, else the number
 // `compute` gives from them, where a NaN means that nothing is known.
 template <class Compute>
@@ -153,14 +157,16 @@ bool isPoint(const Interval& a) {
   return a.lo.isConstant() && a.hi.isConstant() && a.lo.getValue() == a.hi.getValue();
 }
 
-// The integer operators have no exact interval rule; with every operand known exactly, the result is
-// known exactly.
+// The integer operators have no exact interval rule: their result is a 32-bit integer, known exactly
+// where every operand is.
 Interval operatorInterval(TermOp op, const Interval* operands, int arity) {
   if (ssaopt::client::givesTruthValue(op)) return {KvCCfgValue(0.0), KvCCfgValue(1.0)};
-  bool exact = isPoint(operands[0]) && (arity == 1 || isPoint(operands[1]));
-  if (exact && ssaopt::client::isIntegerOperator(op))
+  if (ssaopt::client::isIntegerOperator(op)) {
+    bool exact = isPoint(operands[0]) && (arity == 1 || isPoint(operands[1]));
+    if (!exact) return {KvCCfgValue(kInt32Lowest), KvCCfgValue(kInt32Highest)};
     return point(arity == 1 ? ssaopt::client::applyUnary(op, operands[0].lo)
                             : ssaopt::client::applyBinary(op, operands[0].lo, operands[1].lo));
+  }
   return arity == 1 ? unaryInterval(op, operands[0]) : binaryInterval(op, operands[0], operands[1]);
 }
 
