@@ -120,7 +120,7 @@ private:
         blocks.push_back(v);
     };
     node entry = procedure.pProcedure->getEntryNode();
-    std::vector<edge> out = controlOut(entry);
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(entry);
     if (out.size() == 1) place(m_Graph.target(out.front()));
     for (node v : procedure.blocks) place(v);
     for (node v : m_Graph.nodes())
@@ -170,7 +170,7 @@ private:
   std::vector<std::string> terminatorLines(Function& function, node v, const KvCBasicBlock& block,
                                            node next) {
     KvCCfgExpression* pCondition = block.getBranchCond();
-    std::vector<edge> out = controlOut(v);
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(v);
     if (!pCondition) {
       if (out.size() != 1)
         return {faultLine(function, blockName(block) + " has " + std::to_string(out.size()) +
@@ -207,7 +207,7 @@ private:
 
   std::string resumeLines(Function& function) {
     if (function.loop == ssaopt::nil) return "  (void)ssa_resume;\n";
-    std::vector<edge> out = controlOut(function.loop);
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(function.loop);
     std::string loopName = blockName(*m_Graph.getBasicBlock(function.loop));
     return std::string(kIndent) + "if (ssa_resume == " + kResumeAtHead + ") " +
            jumpText(function, branchTarget(out, true), loopName + " goes true") + "\n" + kIndent +
@@ -215,20 +215,13 @@ private:
            jumpText(function, branchTarget(out, false), loopName + " goes false") + "\n";
   }
 
-  node branchTarget(const std::vector<edge>& out, bool onTrue) const {
+  node branchTarget(const ssaopt::array<edge>& out, bool onTrue) const {
     for (edge e : out) {
       KvCCfgEdgeInfo* pKind = m_Graph.inf(e);
       if (pKind && (onTrue ? pKind->isTrueBranch() != nullptr : pKind->isFalseBranch() != nullptr))
         return m_Graph.target(e);
     }
     return ssaopt::nil;
-  }
-
-  std::vector<edge> controlOut(node v) const {
-    std::vector<edge> out;
-    for (edge e : m_Graph.out(v))
-      if (!m_Graph.inf(e) || !m_Graph.inf(e)->isSSAEdge()) out.push_back(e);
-    return out;
   }
 
   // ---- The interface of the unit -----------------------------------------------------------------
