@@ -1,9 +1,8 @@
 #include "ssaopt/client/variable.h"
 
-#include <algorithm>
+#include <cmath>
+#include <limits>
 #include <utility>
-
-#include "ssaopt/client/data_types.h"
 
 KvCCfgSFVariable::KvCCfgSFVariable(std::string name, const KV_DataType* pType, std::uint32_t declarationIndex,
                                    ssaopt::client::SourcePos pos)
@@ -28,29 +27,27 @@ KvCCfgVariable* originalOf(KvCCfgVariable* pVariable) {
 
 namespace {
 
-// A scaled variable's stored integer stands for another number, so its type range says nothing about
-// the value; neither does a float type.
-bool typeBoundsTheValue(const KvCCfgVariable& variable) {
-  const KV_DataType* pType = variable.getDataType();
-  return pType && !variable.isScaled() && !isFloatType(pType);
+// The bound of the range every value read keeps, where it has one. A read of a volatile variable is an
+// input, always a number: what storing any number gives (a range bounded by the infinities). Anything
+// else holds what was stored, which may be NaN (an open range).
+std::optional<double> declaredBound(const KvCCfgVariable& variable, bool lower) {
+  constexpr double kInfinity = std::numeric_limits<double>::infinity();
+  KvCCfgValue minimum = variable.isVolatile() ? KvCCfgValue(-kInfinity) : KvCCfgValue(eCfgNonConstant);
+  KvCCfgValue maximum = variable.isVolatile() ? KvCCfgValue(kInfinity) : KvCCfgValue(eCfgNonConstant);
+  variable.fitRange(minimum, maximum);
+  const KvCCfgValue& bound = lower ? minimum : maximum;
+  bool bounds = bound.isConstant() && std::isfinite(bound.getValue());
+  return bounds ? std::optional<double>(bound.getValue()) : std::nullopt;
 }
 
 }  // namespace
 
 std::optional<double> declaredLowerBound(const KvCCfgVariable& variable) {
-  std::optional<double> bound;
-  if (typeBoundsTheValue(variable)) bound = typeMinimum(variable.getDataType());
-  if (variable.isLowerBorderSaturated())
-    bound = bound ? std::max(*bound, variable.getLowerLimit()) : variable.getLowerLimit();
-  return bound;
+  return declaredBound(variable, true);
 }
 
 std::optional<double> declaredUpperBound(const KvCCfgVariable& variable) {
-  std::optional<double> bound;
-  if (typeBoundsTheValue(variable)) bound = typeMaximum(variable.getDataType());
-  if (variable.isUpperBorderSaturated())
-    bound = bound ? std::min(*bound, variable.getUpperLimit()) : variable.getUpperLimit();
-  return bound;
+  return declaredBound(variable, false);
 }
 
 }  // namespace ssaopt::client

@@ -31,17 +31,16 @@ using ssaopt::cfg::PhiMerge;
 
 namespace {
 
-// The cast to the variable's type wraps a bound that leaves the type's range (an int8 in [0, 100]
-// plus 100 gives [100, -56]); a wrapped range claims too little, so the variable gets no range.
-void dropInvertedRange(KvCCfgVariable& variable) {
-  const KvCCfgValue* pMin = variable.getMinValue();
-  const KvCCfgValue* pMax = variable.getMaxValue();
-  if (!pMin || !pMax || !pMin->isConstant() || !pMax->isConstant()) return;
-  if (pMin->getValue() <= pMax->getValue()) return;
-  KvCCfgValue unknown(eCfgNonConstant);
-  variable.setMinValueAndDestroyOld(unknown);
-  variable.setMaxValueAndDestroyOld(unknown);
-}
+// A parameter statement as its formal holds it once it ran for some call: each argument already
+// stored as the call stores it (KvCCfgParamStatement::evaluateHeld), so the visit stores the result as
+// it is.
+struct HeldByFormal {
+  const KvCCfgParamStatement& statement;
+
+  KvCCfgValue evaluate() const { return statement.evaluateHeld(); }
+  KvCCfgValue getMinimum() const { return statement.getHeldMinimum(); }
+  KvCCfgValue getMaximum() const { return statement.getHeldMaximum(); }
+};
 
 // The value and range of a variable before a visit, to tell whether the visit changed any of them. Bit
 // for bit: -0.0 after +0.0 compares equal as a value of the lattice, yet prints differently.
@@ -172,7 +171,7 @@ public:
       pVariable->setVarValueAndAdjustCfgValue(value);
     else
       pVariable->setVarValue(value);
-    recordRange(pVariable, definition);
+    recordRange(pVariable, definition, stores);
     if (!before.matches(*pVariable)) definitionChanged(v, *pVariable);
     if (pOld->compare(value) != 0) {
       if (pOld->isUndetermined() && value.isConstant()) changed = true;
@@ -350,16 +349,19 @@ private:
     if (procedure != kNone) m_Unsettled[static_cast<std::size_t>(procedure)] = true;
   }
 
-  // The minimum is stored before the maximum is computed: a definition that reads its own variable
-  // (a recursive call passing a parameter on) sees the new value in both bounds.
+  // The two bounds are fitted together: a type that wraps between them (an int8 in [0, 100] plus 100)
+  // holds its whole range, not the wrapped ends. A value return passes on a range that its variable
+  // already holds.
   template <class Definition>
-  static void recordRange(KvCCfgVariable* pVariable, const Definition& definition) {
+  static void recordRange(KvCCfgVariable* pVariable, const Definition& definition, bool stores) {
     KvCCfgValue minimum = definition.getMinimum();
-    pVariable->setMinValueAndDestroyOld(minimum);
     KvCCfgValue maximum = definition.getMaximum();
-    pVariable->setMaxValueAndDestroyOld(maximum);
-    dropInvertedRange(*pVariable);
+    if (stores)
+      pVariable->setVarRangeAndAdjust(minimum, maximum);
+    else
+      pVariable->setVarRange(minimum, maximum);
   }
+
 
   void registerOperands(std::size_t merge) {
     const PhiMerge& phiMerge = m_Merges[merge];
@@ -468,8 +470,8 @@ void KvCControlFlowGraph::visitAssignment(KvCCfgAssignment* pAssignment, node v,
 void KvCControlFlowGraph::visitParamStatement(KvCCfgParamStatement* pStatement, node v,
                                               EdgeWorkList& cfgWorkList, EdgeWorkList& ssaWorkList,
                                               bool& changed) {
-  m_pPropagation->visitDefinition(pStatement->getVariable(), *pStatement, v, cfgWorkList, ssaWorkList,
-                                  changed, true);
+  m_pPropagation->visitDefinition(pStatement->getVariable(), HeldByFormal{*pStatement}, v, cfgWorkList,
+                                  ssaWorkList, changed, false);
 }
 
 void KvCControlFlowGraph::visitValueReturnStatement(KvCCfgValueReturnStatement* pStatement, node v,
@@ -497,10 +499,10 @@ void KvCControlFlowGraph::visitBranchCondition(KvCCfgExpression* pCond, node v, 
 // All operands take part, whether the edge they come by is executable or not: one that is still
 // undetermined keeps the meet undetermined. Nothing is scheduled: the uses are reached by the flow
 // step or in the next pass. Unlike an assignment, any change to a constant asks for another pass. The
-// operands hold values their definitions already adjusted to the variable, so the meet is stored as
-// it is. (Merging the bounds before the value is stored gives what merging them after would: only an
-// operand without a range has its value for bounds, and storing the value of a phi function's own
-// variable without a range stores no range either.)
+// operands hold values and ranges their definitions already adjusted to the variable, so the meet and
+// the hull are stored as they are. (Merging the bounds before the value is stored gives what merging
+// them after would: only an operand without a range has its value for bounds, and storing the value
+// of a phi function's own variable without a range stores no range either.)
 void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node v, bool& changed) {
   KvCCfgVariable* pVariable = pPhi->getVariable();
   DefinitionSnapshot before(*pVariable);
@@ -508,8 +510,7 @@ void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node v, bool& c
   PhiMerge::Result merged = m_pPropagation->mergeOperands(v, *pPhi);
   pVariable->setVarValue(merged.value);
   if (!pOld->isConstant() && merged.value.isConstant()) changed = true;
-  pVariable->setMinValueAndDestroyOld(merged.minimum);
-  pVariable->setMaxValueAndDestroyOld(merged.maximum);
+  pVariable->setVarRange(merged.minimum, merged.maximum);
   if (!before.matches(*pVariable)) m_pPropagation->definitionChanged(v, *pVariable);
   delete pOld;
 }

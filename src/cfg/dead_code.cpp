@@ -102,6 +102,23 @@ public:
       if (KvCPhiFunction* pPhi = phiFunctionAt(link)) removeOperands(link, *pPhi);
   }
 
+  // A procedure that the constants never let end (a loop whose condition stays true) would lose every
+  // path to its exit node with the dead blocks, and the exit would stand apart from its procedure,
+  // which the graph's consistency forbids. One edge from a reached block into the dead ones, which no
+  // run takes, is bent to the exit instead: "if 1 goto spin else end". It keeps its place among the
+  // out-edges of its source, so its branch stays what it was.
+  void keepExitsAttached() {
+    array<KvCCfgProcedure*> cutOff;
+    for (const auto& named : m_G.m_Procedures)
+      if (named.second->getExitNode() && losesEveryInEdge(named.second->getExitNode()))
+        cutOff.push_back(named.second);
+    if (cutOff.empty()) return;
+    ssaopt::map<KvCCfgProcedure*, edge> intoDeadCode = firstEdgesIntoDeadCode();
+    for (KvCCfgProcedure* pProcedure : cutOff)
+      if (const edge* pEdge = intoDeadCode.lookup(pProcedure))
+        m_G.move_edge(*pEdge, m_G.source(*pEdge), pProcedure->getExitNode());
+  }
+
   // No use set may keep the node, and no payload slot the block.
   void destroyDeadBlock(node n) {
     KvCBasicBlock* pBlock = m_G.getBasicBlock(n);
@@ -116,6 +133,26 @@ public:
   }
 
 private:
+  bool losesEveryInEdge(node v) const {
+    for (edge e : m_G.in(v))
+      if (!m_G.inf(e)->isSSAEdge() && !isDeadBlock(m_G.source(e))) return false;
+    return true;
+  }
+
+  // Per procedure, the first control-flow edge in node order that leads from a reached node to a dead
+  // block.
+  ssaopt::map<KvCCfgProcedure*, edge> firstEdgesIntoDeadCode() const {
+    ssaopt::map<KvCCfgProcedure*, edge> first;
+    for (node v : m_G.nodes()) {
+      if (!isDeadBlock(v)) continue;
+      KvCCfgProcedure* pProcedure = m_G.inf(v)->getProcedure();
+      for (edge e : m_G.in(v))
+        if (!m_G.inf(e)->isSSAEdge() && !isDeadBlock(m_G.source(e)) && !first.lookup(pProcedure))
+          first[pProcedure] = e;
+    }
+    return first;
+  }
+
   KvCPhiFunction* phiFunctionAt(node v) const {
     KvCBasicBlock* pBlock = v ? m_G.getBasicBlock(v) : nullptr;
     return pBlock ? pBlock->isPhiFunction() : nullptr;
@@ -182,6 +219,7 @@ private:
 // Deleting the node in hand is all that happens to the node list, so the live view serves.
 bool KvCControlFlowGraph::eliminateDeadCode() {
   DeadCodeSweep sweep(*this);
+  sweep.keepExitsAttached();
   bool removedOperand = false;
   ParameterReads parameterReads;
   for (node n : nodes()) {

@@ -8,6 +8,9 @@
 #include "ssaopt/frame/control.h"
 #include "ssaopt/frame/report.h"
 #include "ssaopt/ir/expression.h"
+#include "ssaopt/ir/variable.h"
+#include "ssaopt/ir/variable_expression.h"
+#include "ssaopt/values/arithmetic.h"
 #include "ssaopt/values/merge.h"
 
 namespace {
@@ -26,15 +29,42 @@ ssaopt::set<KvCCfgVariable*> usedVariablesOf(const KvCCfgExpression* pExpression
   return pExpression ? pExpression->getUsedVariables() : ssaopt::set<KvCCfgVariable*>();
 }
 
-// Asks every argument that is there the same question and merges the answers in argument order. No
-// argument at all gives the merge of nothing, which is undetermined.
-template <class Fold>
-KvCCfgValue combineArguments(const KvCCfgParamStatement::Arguments& arguments,
-                             KvCCfgValue (KvCCfgExpression::*ask)() const) {
+// Asks every argument that is there what `ask` gives for it and merges the answers in argument order.
+// No argument at all gives the merge of nothing, which is undetermined.
+template <class Fold, class Ask>
+KvCCfgValue combineArguments(const KvCCfgParamStatement::Arguments& arguments, Ask ask) {
   Fold fold;
   for (const auto& entry : arguments)
-    if (entry.second) fold.add((entry.second->*ask)());
+    if (entry.second) fold.add(ask(*entry.second));
   return fold.result();
+}
+
+template <KvCCfgValue (KvCCfgExpression::*question)() const>
+KvCCfgValue asked(KvCCfgExpression& argument) {
+  return (argument.*question)();
+}
+
+KvCCfgVariable* originalOf(KvCCfgVariable* pVariable) {
+  KvCSSAVariable* pVersion = pVariable->isSSAVariable();
+  return pVersion ? pVersion->getOrigVar() : pVariable;
+}
+
+// The summaries pass a variable that a procedure reads on to it as the variable itself: the call
+// stores nothing, and the formal keeps the value it holds.
+bool passesHeldValue(KvCCfgExpression& argument, KvCCfgVariable& formal) {
+  KvCCfgVariableExpression* pMembers = argument.isVariableExpression();
+  if (!pMembers) return false;
+  for (KvCCfgVariable* pMember : pMembers->getUsedVariables())
+    if (originalOf(pMember) != originalOf(&formal)) return false;
+  return true;
+}
+
+// One bound of the range the formal holds after `argument`: the argument's range fitted to the formal
+// as a pair, unless the formal already holds it.
+KvCCfgValue heldBound(KvCCfgExpression& argument, KvCCfgVariable& formal, bool lower) {
+  KvCCfgValue minimum = argument.getMinimum(), maximum = argument.getMaximum();
+  if (!passesHeldValue(argument, formal)) formal.fitRange(minimum, maximum);
+  return lower ? minimum : maximum;
 }
 
 }  // namespace
@@ -121,15 +151,37 @@ KvCCfgExpression* KvCCfgParamStatement::getArgument(KvCCfgProcedureCall* pCall) 
 }
 
 KvCCfgValue KvCCfgParamStatement::evaluate() const {
-  return combineArguments<ssaopt::ValueMeet>(m_Arguments, &KvCCfgExpression::evaluate);
+  return combineArguments<ssaopt::ValueMeet>(m_Arguments, asked<&KvCCfgExpression::evaluate>);
 }
 
 KvCCfgValue KvCCfgParamStatement::getMinimum() const {
-  return combineArguments<ssaopt::ValueMinimum>(m_Arguments, &KvCCfgExpression::getMinimum);
+  return combineArguments<ssaopt::ValueMinimum>(m_Arguments, asked<&KvCCfgExpression::getMinimum>);
 }
 
 KvCCfgValue KvCCfgParamStatement::getMaximum() const {
-  return combineArguments<ssaopt::ValueMaximum>(m_Arguments, &KvCCfgExpression::getMaximum);
+  return combineArguments<ssaopt::ValueMaximum>(m_Arguments, asked<&KvCCfgExpression::getMaximum>);
+}
+
+KvCCfgValue KvCCfgParamStatement::evaluateHeld() const {
+  KvCCfgVariable& formal = *m_pVariable;
+  auto held = [&formal](KvCCfgExpression& argument) {
+    KvCCfgValue value = argument.evaluate();
+    if (!passesHeldValue(argument, formal)) formal.adjustCfgValue(value);
+    return value;
+  };
+  return combineArguments<ssaopt::ValueMeet>(m_Arguments, held);
+}
+
+KvCCfgValue KvCCfgParamStatement::getHeldMinimum() const {
+  KvCCfgVariable& formal = *m_pVariable;
+  auto held = [&formal](KvCCfgExpression& argument) { return heldBound(argument, formal, true); };
+  return combineArguments<ssaopt::ValueMinimum>(m_Arguments, held);
+}
+
+KvCCfgValue KvCCfgParamStatement::getHeldMaximum() const {
+  KvCCfgVariable& formal = *m_pVariable;
+  auto held = [&formal](KvCCfgExpression& argument) { return heldBound(argument, formal, false); };
+  return combineArguments<ssaopt::ValueMaximum>(m_Arguments, held);
 }
 
 ssaopt::set<KvCCfgVariable*> KvCCfgValueReturnStatement::getUsedVariables() const {
