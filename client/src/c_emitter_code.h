@@ -12,8 +12,26 @@
 
 namespace ssaopt::client::detail {
 
-// The fixed helper functions and hook declarations every emitted unit starts with.
-const char* cRuntimeText();
+// What every emitted unit starts with: the include, the floating-point contract, the macros and the
+// declarations of the hooks that the embedding program supplies.
+const char* cPreludeText();
+
+// A function that emitted code may call, by its name.
+struct CHelper {
+  std::string name;
+  std::string text;
+};
+
+// The helpers of the value arithmetic, each after those it calls.
+const std::vector<CHelper>& cRuntimeHelpers();
+
+// The names in C code, outside comments and string literals, that may name a function of the unit:
+// a helper (ssa_...) or a procedure (proc_..., sys_...), which the program's own names never are.
+std::vector<std::string> functionNamesIn(const std::string& code);
+
+// The text of the helpers that `code` calls, directly or through other helpers, in the order of
+// `helpers`: a unit holds no function it does not use.
+std::string calledHelpersText(const std::vector<const CHelper*>& helpers, const std::string& code);
 
 // A C identifier of the program's own that C does not reserve and that the emitter's names
 // (ssa_..., proc_..., sys_...) cannot take.
@@ -37,6 +55,8 @@ public:
 
   // The variable that `pVariable` or the SSA version `pVariable` stands for.
   CVariable& of(KvCCfgVariable* pVariable);
+  // The same, or null for a variable of no program.
+  CVariable* find(KvCCfgVariable* pVariable);
   std::vector<CVariable>& all() { return m_Variables; }
 
   // The C text that reads the variable as a double, that reads the next value of its input stream,
@@ -46,12 +66,15 @@ public:
   std::string storeText(CVariable& variable, const std::string& value);
   // The C constant of what assigning `number` to the variable stores.
   std::string storedConstant(CVariable& variable, double number);
+  // Whether assigning `number` to the variable stores the value it starts with.
+  static bool storesInitialValue(const CVariable& variable, double number);
   // Whether the C code calls the variable's input hook.
   static bool hasInputHook(const CVariable& variable) { return variable.readsInput || variable.refilled; }
 
-  // Declarations, per-variable helpers (stores, element access, observation, refill) of the used
-  // variables, and the declarations of the input hooks.
+  // The declarations of the input hooks and of the globals of the used variables.
   std::string declarations() const;
+  // The helpers of the used variables: stores, element access, observation, refill.
+  std::vector<CHelper> helpers() const;
   std::string inputHook(const CVariable& variable) const { return "ssa_input_" + variable.name; }
 
 private:
@@ -75,6 +98,8 @@ public:
   // The C lines of one statement (none for those that generate no code); throws Unemittable.
   std::vector<std::string> statement(KvCCfgStatement& statement, const KvCControlFlowGraph& graph,
                                      bool argumentsAtCalls);
+  // Whether the assignment stores a constant that is the variable's initial value.
+  static bool storesInitialValue(KvCCfgAssignment& assignment, const CVariable& variable);
   // "if (...) JUMP" for a branch condition; throws Unemittable.
   std::vector<std::string> branch(KvCCfgExpression* pCondition, const std::string& jump);
 
@@ -86,6 +111,7 @@ private:
     std::string text;
   };
 
+  static KvCCfgVariable* onlyVariableOf(KvCCfgExpression* pExpression);
   Code expression(KvCCfgExpression* pExpression, bool condition);
   Code terms(const KvCCfgSFExpression& expression, bool condition);
   std::vector<std::string> assignment(KvCCfgAssignment& assignment);

@@ -8,6 +8,7 @@
 #include <utility>
 
 #include "c_emitter_code.h"
+#include "infix_text.h"
 #include "ssaopt/client/numbers.h"
 #include "ssaopt/client/statements.h"
 #include "ssaopt/client/variable.h"
@@ -21,12 +22,6 @@ namespace {
 
 constexpr int kInfixAdditive = 70;
 constexpr int kInfixComparison = 50;
-
-struct Piece {
-  std::string text;
-  int precedence;
-  bool readsTemporary = false;  // an input read first into a temporary
-};
 
 // The runtime helper of each operator that C's own operators would not compute alike.
 const char* helperOf(TermOp op) {
@@ -48,11 +43,7 @@ bool isComparison(TermOp op) {
          op == TermOp::GreaterEqual || op == TermOp::Equal || op == TermOp::NotEqual;
 }
 
-std::string parenthesised(const Piece& piece, bool needed) {
-  return needed ? "(" + piece.text + ")" : piece.text;
-}
-
-Piece literalPiece(double number) {
+InfixText::Term literalTerm(double number) {
   std::string text;
   if (std::isnan(number))
     text = "SSA_NAN";
@@ -61,23 +52,19 @@ Piece literalPiece(double number) {
   else
     text = formatNumber(number);
   if (text.find_first_of(".eAN") == std::string::npos) text += ".0";
-  return Piece{text, text[0] == '-' ? kUnaryPrecedence : kAtomPrecedence};
+  return InfixText::Term{text, "", "", text[0] == '-' ? kUnaryPrecedence : kAtomPrecedence};
 }
 
-Piece operatorPiece(TermOp op, const Piece* operands, bool topComparison) {
+InfixText::Term operatorTerm(TermOp op, const InfixText::Operand* operands, bool topComparison) {
   if (op == TermOp::Negate)
-    return Piece{"-" + parenthesised(operands[0],
-                                     operands[0].precedence < kUnaryPrecedence || operands[0].text[0] == '-'),
-                 kUnaryPrecedence};
+    return InfixText::Term{
+        "-", "", "", kUnaryPrecedence, {operands[0].precedence < kUnaryPrecedence || operands[0].first == '-'}};
   if (op == TermOp::Add || op == TermOp::Subtract || topComparison) {
     int precedence = topComparison ? kInfixComparison : kInfixAdditive;
-    return Piece{parenthesised(operands[0], operands[0].precedence < precedence) + " " + spellingOf(op) +
-                     " " + parenthesised(operands[1], operands[1].precedence <= precedence),
-                 precedence};
+    return InfixText::Term{"", std::string(" ") + spellingOf(op) + " ", "", precedence,
+                           {operands[0].precedence < precedence, operands[1].precedence <= precedence}};
   }
-  std::string text = std::string(helperOf(op)) + "(" + operands[0].text;
-  if (arityOf(op) == 2) text += ", " + operands[1].text;
-  return Piece{text + ")", kAtomPrecedence};
+  return InfixText::Term{std::string(helperOf(op)) + "(", arityOf(op) == 2 ? ", " : "", ")", kAtomPrecedence};
 }
 
 bool readsInput(const KvCCfgSFExpression::Term& term) {
@@ -136,7 +123,7 @@ CStatements::Code CStatements::expression(KvCCfgExpression* pExpression, bool co
   KvCCfgValue value = pExpression->evaluate();
   if (!dynamic_cast<KvCCfgValueExpression*>(pExpression) || !value.isConstant())
     throw Unemittable{"an expression has no value"};
-  return Code{{}, literalPiece(value.getValue()).text};
+  return Code{{}, literalTerm(value.getValue()).before};
 }
 
 CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool condition) {
@@ -144,50 +131,55 @@ CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool 
   if (terms.empty()) throw Unemittable{"an expression without terms"};
   bool readsFirst = std::count_if(terms.begin(), terms.end(), readsInput) > 1;
   Code code;
-  std::vector<Piece> stack;
+  InfixText text;
+  std::vector<bool> readsTemporary;  // of each piece: an input read first into a temporary
   for (std::size_t i = 0; i < terms.size(); ++i) {
     const KvCCfgSFExpression::Term& term = terms[i];
     std::size_t arity = static_cast<std::size_t>(arityOf(term.op));
-    const Piece* operands = stack.data() + (stack.size() - arity);
-    Piece result;
-    bool readsTemporary =
-        std::any_of(operands, operands + arity, [](const Piece& piece) { return piece.readsTemporary; });
+    bool operandsReadTemporary = std::any_of(readsTemporary.end() - static_cast<std::ptrdiff_t>(arity),
+                                             readsTemporary.end(), [](bool reads) { return reads; });
+    InfixText::Term result;
+    bool resultReadsTemporary = operandsReadTemporary && !readsInput(term);
     if (term.op == TermOp::Literal) {
-      result = literalPiece(term.number);
+      result = literalTerm(term.number);
     } else if (namesVariable(term.op)) {
       CVariable& variable = m_Variables.of(term.pVariable);
       if (variable.pVariable->isArray() != (term.op != TermOp::Variable))
         throw Unemittable{"uses " + nameOf(term.pVariable) +
                           (variable.pVariable->isArray() ? " without" : " with") + " an index"};
       if (readsInput(term)) {
-        // An element of an input array reads the stream whatever its index, which is only computed.
-        if (term.op == TermOp::ElementRead && readsTemporary)
-          code.prelude.push_back("(void)(" + operands[0].text + ");");
-        result = Piece{m_Variables.inputText(variable), kAtomPrecedence};
+        std::string input = m_Variables.inputText(variable);
         if (readsFirst) {
           std::string name = temporary("in");
-          code.prelude.push_back("double " + name + " = " + result.text + ";");
-          result = Piece{name, kAtomPrecedence, true};
+          code.prelude.push_back("double " + name + " = " + input + ";");
+          input = name;
+          resultReadsTemporary = true;
         }
+        // An element of an input array reads the stream whatever its index, which is only computed
+        // where it reads temporaries, so that each is used.
+        if (term.op == TermOp::ElementRead && operandsReadTemporary)
+          result = InfixText::Term{"((void)(", "", "), " + input + ")", kAtomPrecedence};
+        else
+          result = InfixText::Term{input, "", "", kAtomPrecedence, {false}, {term.op == TermOp::ElementRead}};
       } else if (term.op == TermOp::Variable) {
-        std::string text = m_Variables.readText(variable);
-        result = Piece{text, text[0] == '(' ? kUnaryPrecedence : kAtomPrecedence};
+        std::string read = m_Variables.readText(variable);
+        result = InfixText::Term{read, "", "", read[0] == '(' ? kUnaryPrecedence : kAtomPrecedence};
       } else if (term.op == TermOp::ElementRead) {
         variable.stored = true;
-        result = Piece{"ssa_read_" + variable.name + "(" + operands[0].text + ")", kAtomPrecedence};
+        result = InfixText::Term{"ssa_read_" + variable.name + "(", "", ")", kAtomPrecedence};
       } else {
         variable.stored = true;
-        result =
-            Piece{"ssa_write_" + variable.name + "(" + operands[0].text + ", " + operands[1].text + ")", 0};
+        result = InfixText::Term{"ssa_write_" + variable.name + "(", ", ", ")", 0};
       }
     } else {
-      result = operatorPiece(term.op, operands, condition && i + 1 == terms.size() && isComparison(term.op));
+      result = operatorTerm(term.op, text.operands(arity),
+                            condition && i + 1 == terms.size() && isComparison(term.op));
     }
-    result.readsTemporary = result.readsTemporary || (readsTemporary && !readsInput(term));
-    stack.resize(stack.size() - arity);
-    stack.push_back(std::move(result));
+    text.push(arity, result);
+    readsTemporary.resize(readsTemporary.size() - arity);
+    readsTemporary.push_back(resultReadsTemporary);
   }
-  code.text = stack.back().text;
+  code.text = text.text(text.pieces() - 1);
   return code;
 }
 
@@ -205,8 +197,25 @@ std::vector<std::string> CStatements::statement(KvCCfgStatement& statement, cons
 
 std::vector<std::string> CStatements::branch(KvCCfgExpression* pCondition, const std::string& jump) {
   m_Temporaries = 0;
+  // A constant condition as C's truth value: "if (-2.0)" draws a warning of a changed value.
+  if (std::optional<double> number = constantOf(pCondition)) return {"if (" + std::string(*number != 0.0 ? "1" : "0") + ") " + jump};
   Code condition = expression(pCondition, true);
   return scoped(condition.prelude, {"if (" + condition.text + ") " + jump});
+}
+
+bool CStatements::storesInitialValue(KvCCfgAssignment& assignment, const CVariable& variable) {
+  std::optional<double> number = constantOf(assignment.getRHS());
+  return number && CVariables::storesInitialValue(variable, *number);
+}
+
+// The variable that an expression only reads, where it is a single variable.
+KvCCfgVariable* CStatements::onlyVariableOf(KvCCfgExpression* pExpression) {
+  if (KvCCfgSFExpression* pTerms = pExpression ? pExpression->isSFExpression() : nullptr)
+    return pTerms->getTerms().size() == 1 && pTerms->getTerms()[0].op == TermOp::Variable
+               ? pTerms->getTerms()[0].pVariable
+               : nullptr;
+  auto* pMembers = dynamic_cast<KvCCfgVariableExpression*>(pExpression);
+  return pMembers && pMembers->getUsedVariables().size() == 1 ? *pMembers->getUsedVariables().begin() : nullptr;
 }
 
 std::vector<std::string> CStatements::assignment(KvCCfgAssignment& assignment) {
@@ -217,6 +226,10 @@ std::vector<std::string> CStatements::assignment(KvCCfgAssignment& assignment) {
   }
   if (!assignment.getLHS()) throw Unemittable{"an assignment without left-hand side"};
   CVariable& variable = m_Variables.of(assignment.getLHS());
+  // A copy between versions of one variable stores a value that the variable holds already, which
+  // its store leaves as it is.
+  KvCCfgVariable* pCopied = onlyVariableOf(assignment.getRHS());
+  if (pCopied && m_Variables.find(pCopied) == &variable && !variable.pVariable->isVolatile()) return {};
   if (std::optional<double> number = constantOf(assignment.getRHS());
       number && !variable.pVariable->isArray())
     return {variable.name + " = " + m_Variables.storedConstant(variable, *number) + ";"};
@@ -248,7 +261,7 @@ std::vector<std::string> CStatements::call(KvCCfgProcedureCall& call, const KvCC
     CVariable& formal = m_Variables.of(pParam->getVariable());
     auto* pMembers = dynamic_cast<KvCCfgVariableExpression*>(pArgument);
     if (!argumentsAtCalls && pMembers && pMembers->getUsedVariables().size() == 1 &&
-        &m_Variables.of(*pMembers->getUsedVariables().begin()) == &formal)
+        m_Variables.find(*pMembers->getUsedVariables().begin()) == &formal)
       continue;
     arguments.emplace_back(&formal, expression(pArgument, false));
   }

@@ -127,9 +127,14 @@ CVariables::CVariables(const Program& program) {
 }
 
 CVariable& CVariables::of(KvCCfgVariable* pVariable) {
+  CVariable* pFound = find(pVariable);
+  if (!pFound) throw Unemittable{"reads or writes a variable of no program"};
+  return *pFound;
+}
+
+CVariable* CVariables::find(KvCCfgVariable* pVariable) {
   auto found = m_Index.find(originalOf(pVariable));
-  if (found == m_Index.end()) throw Unemittable{"reads or writes a variable of no program"};
-  return m_Variables[found->second];
+  return found == m_Index.end() ? nullptr : &m_Variables[found->second];
 }
 
 std::string CVariables::inputText(CVariable& variable) {
@@ -152,120 +157,123 @@ std::string CVariables::storeText(CVariable& variable, const std::string& value)
   return storeCall(variable, value);
 }
 
+bool CVariables::storesInitialValue(const CVariable& variable, double number) {
+  const KvCCfgSFVariable& declared = *variable.pVariable;
+  return sameBits(storedValue(declared, number), storedValue(declared, declared.getInitValue()->getValue()));
+}
+
 namespace {
 
-class DeclarationWriter {
-public:
-  explicit DeclarationWriter(std::ostringstream& out) : m_Out(out) {}
+std::string commentOf(const CVariable& variable) {
+  const KvCCfgSFVariable& declared = *variable.pVariable;
+  std::string notes;
+  if (variable.heldAsDouble && declared.getDataType() != KV_DataType::float64())
+    notes += std::string(nameOfDataType(declared.getDataType())) +
+             (declared.isScaled() ? " scaled: the value it stands for" : " with limits its type cannot hold");
+  if (declared.isOutput()) notes += std::string(notes.empty() ? "" : ", ") + "output";
+  if (declared.isVolatile()) notes += std::string(notes.empty() ? "" : ", ") + "input";
+  return notes.empty() ? "" : " /* " + notes + " */";
+}
 
-  void declare(const CVariable& variable) {
-    const KvCCfgSFVariable& declared = *variable.pVariable;
-    std::string initial = literalOf(variable, storedValue(declared, declared.getInitValue()->getValue()));
-    m_Out << "static " << variable.type << " " << variable.name;
-    if (declared.isArray()) {
-      m_Out << "[" << declared.getArrayLength() << "] = {";
-      bool allZero = initial == "0" || initial == "0.0";
-      for (std::uint32_t i = 0; i < (allZero ? 1 : declared.getArrayLength()); ++i)
-        m_Out << (i ? ", " : "") << initial;
-      m_Out << "}";
-    } else {
-      m_Out << " = " << initial;
-    }
-    m_Out << ";" << commentOf(variable) << "\n";
+std::string declarationOf(const CVariable& variable) {
+  const KvCCfgSFVariable& declared = *variable.pVariable;
+  std::string initial = literalOf(variable, storedValue(declared, declared.getInitValue()->getValue()));
+  std::string text = "static " + variable.type + " " + variable.name;
+  if (declared.isArray()) {
+    text += "[" + std::to_string(declared.getArrayLength()) + "] = {";
+    bool allZero = initial == "0" || initial == "0.0";
+    for (std::uint32_t i = 0; i < (allZero ? 1 : declared.getArrayLength()); ++i)
+      text += (i ? ", " : "") + initial;
+    text += "}";
+  } else {
+    text += " = " + initial;
   }
+  return text + ";" + commentOf(variable) + "\n";
+}
 
-  void storeHelper(const CVariable& variable) {
-    if (!variable.hasStoreHelper) return;
-    const KvCCfgSFVariable& declared = *variable.pVariable;
-    m_Out << "static inline " << variable.type << " ssa_store_" << variable.name << "(double x) {\n";
-    bool saturated = declared.isUpperBorderSaturated() || declared.isLowerBorderSaturated();
-    if (saturated) m_Out << "  int saturated = 0;\n";
-    if (declared.isUpperBorderSaturated())
-      m_Out << "  if (x > " << doubleLiteral(declared.getUpperLimit())
-            << ") {\n    x = " << doubleLiteral(declared.getUpperLimit()) << ";\n    saturated = 1;\n  }\n";
-    if (declared.isLowerBorderSaturated())
-      m_Out << "  if (x < " << doubleLiteral(declared.getLowerLimit())
-            << ") {\n    x = " << doubleLiteral(declared.getLowerLimit()) << ";\n    saturated = 1;\n  }\n";
-    if (saturated) m_Out << "  if (saturated) return x;\n";
-    m_Out << "  return " << unsaturatedStore(variable) << ";\n}\n";
+std::string unsaturatedStore(const CVariable& variable) {
+  const KvCCfgSFVariable& declared = *variable.pVariable;
+  if (declared.isScaled()) {
+    const KV_Scaling& scaling = *declared.getScaling();
+    if (scaling.getLSB() == 0.0) return "x";
+    return "ssa_represent(x, " + doubleLiteral(scaling.getLSB()) + ", " + doubleLiteral(scaling.getOffset()) +
+           ")";
   }
+  std::string cast = castHelperOf(declared.getDataType());
+  return cast.empty() ? "x" : cast + "(x)";
+}
 
-  void arrayHelpers(const CVariable& variable, const std::string& store, const std::string& hook) {
-    const KvCCfgSFVariable& declared = *variable.pVariable;
-    if (!declared.isArray()) return;
-    std::string length = std::to_string(declared.getArrayLength());
-    std::string element =
-        variable.heldAsDouble ? variable.name + "[ssa_i]" : "(double)" + variable.name + "[ssa_i]";
-    const std::string& name = variable.name;
-    m_Out << "static inline double ssa_read_" << name
-          << "(double ssa_at) {\n  int32_t ssa_i = ssa_int(ssa_at);\n"
-          << "  return ssa_i >= 0 && ssa_i < " << length << " ? " << element << " : 0.0;\n}\n";
-    m_Out << "static inline void ssa_write_" << name << "(double ssa_at, double ssa_new) {\n"
-          << "  int32_t ssa_i = ssa_int(ssa_at);\n  if (ssa_i >= 0 && ssa_i < " << length << ") " << name
-          << "[ssa_i] = " << store << ";\n}\n";
-    m_Out << "static inline void ssa_fill_" << name
-          << "(double ssa_new) {\n  int ssa_i;\n  for (ssa_i = 0; ssa_i < " << length << "; ++ssa_i) " << name
-          << "[ssa_i] = " << store << ";\n}\n";
-    m_Out << "static inline void ssa_observe_" << name << "(void) {\n  int ssa_i;\n  ssa_array_begin(\""
-          << declared.getName() << "\");\n  for (ssa_i = 0; ssa_i < " << length << "; ++ssa_i) ssa_element("
-          << element << ");\n  ssa_array_end();\n}\n";
-    if (variable.refilled)
-      m_Out << "static inline void ssa_refill_" << name
-            << "(void) {\n  int ssa_i;\n  for (ssa_i = 0; ssa_i < " << length << "; ++ssa_i) " << name
-            << "[ssa_i] = " << refilledValue(variable, hook) << ";\n}\n";
-  }
+CHelper storeHelper(const CVariable& variable) {
+  const KvCCfgSFVariable& declared = *variable.pVariable;
+  std::ostringstream out;
+  out << "static inline " << variable.type << " ssa_store_" << variable.name << "(double x) {\n";
+  bool saturated = declared.isUpperBorderSaturated() || declared.isLowerBorderSaturated();
+  if (saturated) out << "  int saturated = 0;\n";
+  if (declared.isUpperBorderSaturated())
+    out << "  if (x > " << doubleLiteral(declared.getUpperLimit())
+        << ") {\n    x = " << doubleLiteral(declared.getUpperLimit()) << ";\n    saturated = 1;\n  }\n";
+  if (declared.isLowerBorderSaturated())
+    out << "  if (x < " << doubleLiteral(declared.getLowerLimit())
+        << ") {\n    x = " << doubleLiteral(declared.getLowerLimit()) << ";\n    saturated = 1;\n  }\n";
+  if (saturated) out << "  if (saturated) return x;\n";
+  out << "  return " << unsaturatedStore(variable) << ";\n}\n";
+  return CHelper{"ssa_store_" + variable.name, out.str()};
+}
 
-private:
-  static std::string commentOf(const CVariable& variable) {
-    const KvCCfgSFVariable& declared = *variable.pVariable;
-    std::string notes;
-    if (variable.heldAsDouble && declared.getDataType() != KV_DataType::float64())
-      notes +=
-          std::string(nameOfDataType(declared.getDataType())) +
-          (declared.isScaled() ? " scaled: the value it stands for" : " with limits its type cannot hold");
-    if (declared.isOutput()) notes += std::string(notes.empty() ? "" : ", ") + "output";
-    if (declared.isVolatile()) notes += std::string(notes.empty() ? "" : ", ") + "input";
-    return notes.empty() ? "" : " /* " + notes + " */";
-  }
+// The streams give values the variable holds already; only the C type needs converting.
+std::string refilledValue(const CVariable& variable, const std::string& hook) {
+  if (variable.heldAsDouble) return hook + "()";
+  std::string cast = castHelperOf(variable.pVariable->getDataType());
+  return cast.empty() ? hook + "()" : cast + "(" + hook + "())";
+}
 
-  static std::string unsaturatedStore(const CVariable& variable) {
-    const KvCCfgSFVariable& declared = *variable.pVariable;
-    if (declared.isScaled()) {
-      const KV_Scaling& scaling = *declared.getScaling();
-      if (scaling.getLSB() == 0.0) return "x";
-      return "ssa_represent(x, " + doubleLiteral(scaling.getLSB()) + ", " +
-             doubleLiteral(scaling.getOffset()) + ")";
-    }
-    std::string cast = castHelperOf(declared.getDataType());
-    return cast.empty() ? "x" : cast + "(x)";
-  }
-
-  // The streams give values the variable holds already; only the C type needs converting.
-  static std::string refilledValue(const CVariable& variable, const std::string& hook) {
-    if (variable.heldAsDouble) return hook + "()";
-    std::string cast = castHelperOf(variable.pVariable->getDataType());
-    return cast.empty() ? hook + "()" : cast + "(" + hook + "())";
-  }
-
-  std::ostringstream& m_Out;
-};
+void addArrayHelpers(const CVariable& variable, const std::string& hook, std::vector<CHelper>& helpers) {
+  const KvCCfgSFVariable& declared = *variable.pVariable;
+  const std::string& name = variable.name;
+  std::string length = std::to_string(declared.getArrayLength());
+  std::string store = storeCall(variable, "ssa_new");
+  std::string element = variable.heldAsDouble ? name + "[ssa_i]" : "(double)" + name + "[ssa_i]";
+  std::string loop = "  int ssa_i;\n  for (ssa_i = 0; ssa_i < " + length + "; ++ssa_i) ";
+  helpers.push_back({"ssa_read_" + name, "static inline double ssa_read_" + name +
+                                             "(double ssa_at) {\n  int32_t ssa_i = ssa_int(ssa_at);\n"
+                                             "  return ssa_i >= 0 && ssa_i < " +
+                                             length + " ? " + element + " : 0.0;\n}\n"});
+  helpers.push_back({"ssa_write_" + name, "static inline void ssa_write_" + name +
+                                              "(double ssa_at, double ssa_new) {\n"
+                                              "  int32_t ssa_i = ssa_int(ssa_at);\n  if (ssa_i >= 0 && ssa_i < " +
+                                              length + ") " + name + "[ssa_i] = " + store + ";\n}\n"});
+  helpers.push_back({"ssa_fill_" + name, "static inline void ssa_fill_" + name + "(double ssa_new) {\n" + loop +
+                                             name + "[ssa_i] = " + store + ";\n}\n"});
+  helpers.push_back({"ssa_observe_" + name, "static inline void ssa_observe_" + name +
+                                                "(void) {\n  int ssa_i;\n  ssa_array_begin(\"" +
+                                                declared.getName() + "\");\n  for (ssa_i = 0; ssa_i < " + length +
+                                                "; ++ssa_i) ssa_element(" + element + ");\n  ssa_array_end();\n}\n"});
+  helpers.push_back({"ssa_refill_" + name, "static inline void ssa_refill_" + name + "(void) {\n" + loop + name +
+                                               "[ssa_i] = " + refilledValue(variable, hook) + ";\n}\n"});
+}
 
 }  // namespace
 
 std::string CVariables::declarations() const {
-  std::ostringstream hooks, globals, helpers;
-  DeclarationWriter globalWriter(globals), helperWriter(helpers);
+  std::string hooks, globals;
   for (const CVariable& variable : m_Variables) {
-    if (hasInputHook(variable)) hooks << "double " << inputHook(variable) << "(void);\n";
-    if (!variable.stored) continue;
-    globalWriter.declare(variable);
-    helperWriter.storeHelper(variable);
-    helperWriter.arrayHelpers(variable, storeCall(variable, "ssa_new"), inputHook(variable));
+    if (hasInputHook(variable)) hooks += "double " + inputHook(variable) + "(void);\n";
+    if (variable.stored) globals += declarationOf(variable);
   }
   std::string text;
-  for (const std::string& section : {hooks.str(), globals.str(), helpers.str()})
+  for (const std::string& section : {hooks, globals})
     if (!section.empty()) text += section + "\n";
   return text;
+}
+
+std::vector<CHelper> CVariables::helpers() const {
+  std::vector<CHelper> helpers;
+  for (const CVariable& variable : m_Variables) {
+    if (!variable.stored) continue;
+    if (variable.hasStoreHelper) helpers.push_back(storeHelper(variable));
+    if (variable.pVariable->isArray()) addArrayHelpers(variable, inputHook(variable), helpers);
+  }
+  return helpers;
 }
 
 }  // namespace ssaopt::client::detail

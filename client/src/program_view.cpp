@@ -149,7 +149,7 @@ node ProgramView::continuationOf(node v) const {
   std::vector<edge> out = controlOutEdges(v);
   if (out.size() != 1 || m_Graph.getBasicBlock(v)->getBranchCond()) return ssaopt::nil;
   node next = m_Graph.target(out[0]);
-  return isShownBlock(next) && controlInEdges(next).size() == 1 ? next : ssaopt::nil;
+  return isShownBlock(next) && hasOneControlInEdge(next) ? next : ssaopt::nil;
 }
 
 // ---- Labels -----------------------------------------------------------------------------------------
@@ -283,6 +283,14 @@ std::vector<edge> ProgramView::phiOperandEdges(node v, std::size_t operands) con
     in = controlInEdges(m_Graph.source(in[0]));
   }
   return in;
+}
+
+// Without listing them all: a block that many branches join is the continuation of each.
+bool ProgramView::hasOneControlInEdge(node v) const {
+  std::size_t count = 0;
+  for (edge e : m_Graph.in(v))
+    if (!m_Graph.inf(e)->isSSAEdge() && ++count > 1) return false;
+  return count == 1;
 }
 
 std::vector<edge> ProgramView::controlInEdges(node v) const {

@@ -57,6 +57,7 @@ public:
   // The control-flow edges (not SSA edges), in adjacency order.
   std::vector<ssaopt::edge> controlOutEdges(ssaopt::node v) const;
   std::vector<ssaopt::edge> controlInEdges(ssaopt::node v) const;
+  bool hasOneControlInEdge(ssaopt::node v) const;
 
 private:
   void findHiddenBlocks();

@@ -2,6 +2,8 @@
 // computes what the interpreter computes is checked by compiling it (tests/tools/cc_check_test.cpp).
 #include "ssaopt/client/c_emitter.h"
 
+#include <regex>
+
 #include "client_testing.h"
 #include "passes.h"
 
@@ -10,6 +12,10 @@ namespace {
 ::testing::AssertionResult contains(const std::string& text, const std::string& piece) {
   if (text.find(piece) != std::string::npos) return ::testing::AssertionSuccess();
   return ::testing::AssertionFailure() << "no\n" << piece << "\nin\n" << text;
+}
+
+bool defines(const std::string& text, const std::string& function) {
+  return std::regex_search(text, std::regex("\nstatic inline [a-z0-9_]+ " + function + "\\("));
 }
 
 class EmittingC : public clienttest::ClientTest {
@@ -100,6 +106,82 @@ TEST_F(EmittingC, CallsAssignTheirArgumentsAndMainBecomesAStepFunction) {
     EXPECT_TRUE(contains(text, "int ssaopt_step(void) {"));
     EXPECT_TRUE(contains(text, "  ssa_value(\"total\", (double)total);\n  ssa_output_end();\n"));
   }
+}
+
+TEST_F(EmittingC, TheUnitHoldsOnlyTheFunctionsItCalls) {
+  // Warnings of unused functions are errors under -Werror: helpers, per-variable helpers and
+  // procedures appear only where something calls them, and procedures are static.
+  std::string text = emit(
+                         "var int16 a[2] = 0;\n"
+                         "var int16 x = 0;\n"
+                         "var int16 y scale(0.5) = 0;\n"
+                         "proc #main {\n"
+                         "  x = a[x] << 1;\n"
+                         "  call used();\n"
+                         "}\n"
+                         "proc used {\n"
+                         "  y = x;\n"
+                         "}\n"
+                         "proc unused {\n"
+                         "  call used();\n"
+                         "  x = x * 2;\n"
+                         "}\n")
+                         .text;
+  for (const char* called : {"ssa_shl", "ssa_signed", "ssa_int", "ssa_read_a", "ssa_store_y", "ssa_represent",
+                             "ssa_round", "ssa_sign_bit", "ssa_to_int16", "ssa_wrap"})
+    EXPECT_TRUE(defines(text, called)) << called << " in\n" << text;
+  for (const char* unused : {"ssa_mul", "ssa_div", "ssa_shr", "ssa_write_a", "ssa_fill_a", "ssa_observe_a",
+                             "ssa_to_int8", "ssa_to_float32", "proc_unused"})
+    EXPECT_FALSE(contains(text, unused)) << unused;
+  EXPECT_TRUE(contains(text, "static void proc_used(void) {\n"));
+}
+
+TEST_F(EmittingC, StatementsThatChangeNothingGenerateNoCode) {
+  // The first step starts with the variables as their static initialisers left them, so the
+  // initialisations of SSA form store nothing new; and a copy between versions of one variable stores
+  // what it holds. Left in, the stores would keep the compiler from seeing that a never-written
+  // variable is a constant.
+  std::string text = emit(
+                         "var int16 a = 5;\n"
+                         "var int16 b = 0;\n"
+                         "var float64 f = 1;\n"
+                         "var int16 in volatile;\n"
+                         "var int16 p = 0;\n"
+                         "proc #main {\n"
+                         "  b = a + in;\n"
+                         "  f = f;\n"
+                         "  call g(7);\n"
+                         "}\n"
+                         "proc g(p) {\n"
+                         "  b = p;\n"
+                         "}\n",
+                         {"inline", "ssa"})
+                         .text;
+  EXPECT_TRUE(contains(text,
+                       "  if (ssa_resume == 2) goto bb6;\n"
+                       "bb0:\n"
+                       "  b = ssa_to_int16((double)a + ssa_input_in());\n"
+                       "  p = 7;\n"
+                       "  b = ssa_to_int16((double)p);\n"
+                       "  return 1;"));
+  EXPECT_FALSE(contains(text, " f = ")) << "f is neither read nor written";
+  EXPECT_FALSE(contains(text, "static double f")) << "nor declared";
+}
+
+TEST_F(EmittingC, ConstantConditionsAreCsTruthValues) {
+  // "if (-2.0)" draws a warning of a literal conversion that changes the value.
+  std::string text = emit(
+                         "var int16 x output = 0;\n"
+                         "proc #main {\n"
+                         "  if -2 goto a else end;\n"
+                         "a:\n"
+                         "  if 0 goto b else end;\n"
+                         "b:\n"
+                         "  x = 1;\n"
+                         "}\n")
+                         .text;
+  EXPECT_TRUE(contains(text, "  if (1) goto a;\n"));
+  EXPECT_TRUE(contains(text, "  if (0) goto b;\n"));
 }
 
 }  // namespace
