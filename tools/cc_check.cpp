@@ -381,7 +381,8 @@ private:
       return kFailure;
     }
     if (!build(*pOriginal, "original", {}) || !build(*pOptimised, "optimised", {}) ||
-        !build(*pOptimised, "optimised", {"-fsanitize=undefined", "-fno-sanitize-recover=undefined"}))
+        !build(*pOptimised, "optimised",
+               {"-fsanitize=undefined", "-fno-sanitize-recover=undefined", "-DSSA_CHECK_RANGES"}))
       return kFailure;
     return compareRuns(*pOriginal, *pOptimised);
   }
@@ -399,11 +400,11 @@ private:
   // Emits and compiles the program; false after saying why it failed.
   bool build(const client::Program& program, const std::string& name, const std::vector<std::string>& flags) {
     std::string stem = name + (flags.empty() ? "" : "_sanitized");
-    client::EmittedC emitted = client::emitC(program);
+    client::EmittedC emitted = client::emitC(program, client::EmitOptions{!m_Options.keepChecks});
     fs::path source = m_Directory.path() / (stem + ".c"), harness = m_Directory.path() / (stem + "_main.c");
     std::ofstream(source) << emitted.text;
     std::ofstream(harness) << harnessText(emitted);
-    Binary binary{"compiled " + name + (flags.empty() ? "" : " (-fsanitize=undefined)"),
+    Binary binary{"compiled " + name + (flags.empty() ? "" : " (-fsanitize=undefined -DSSA_CHECK_RANGES)"),
                   m_Directory.path() / stem};
     std::vector<std::string> command = shellWords(compiler());
     command.insert(command.end(), {"-std=c99", "-O2", "-Wall", "-Wextra", "-Werror"});

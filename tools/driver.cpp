@@ -76,7 +76,7 @@ private:
   bool writeResult() {
     std::string result = m_Options.emit == Emit::Dot ? client::writeDot(*m_pProgram)
                          : m_Options.emit == Emit::C
-                             ? client::emitC(*m_pProgram).text
+                             ? client::emitC(*m_pProgram, client::EmitOptions{!m_Options.keepChecks}).text
                              : client::printProgram(*m_pProgram, client::PrintOptions{m_Options.showValues});
     if (m_Options.outputPath.empty()) {
       m_Out << result;

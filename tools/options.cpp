@@ -51,6 +51,7 @@ bool parseFlag(const std::string& argument, Options& options) {
       {"--stats", &Options::stats},
       {"--time-passes", &Options::timePasses},
       {"--show-values", &Options::showValues},
+      {"--keep-checks", &Options::keepChecks},
       {"--help", &Options::help},
       {"-h", &Options::help},
       {"--version", &Options::version},
@@ -239,6 +240,8 @@ std::string usageText() {
           "  --emit=text|dot|c  write the result as program text (default), as Graphviz or as C\n"
           "  -o FILE            write the result to FILE instead of standard output\n"
           "  --show-values      in text output, show propagated values, ranges and executable edges\n"
+          "  --keep-checks      in C output (and cc-check), keep each saturation, cast and index\n"
+          "                     check that the propagated ranges show to be needless\n"
           "  --verify           check the graph after every pass with internal checks on; report\n"
           "                     every internal error and consistency failure and exit with 1\n"
           "  --stats            count procedures, blocks, statements and phi functions before\n"

@@ -34,6 +34,7 @@ struct Options {
   bool stats = false;
   bool timePasses = false;
   bool showValues = false;
+  bool keepChecks = false;  // in C: also the checks that propagated ranges make needless
   bool help = false;
   bool version = false;
   // Of run and check: passes of "#main" per run, runs, the seed (of the first run), and a file of

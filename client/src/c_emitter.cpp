@@ -39,12 +39,12 @@ std::string cString(const std::string& text) {
 
 class CEmitter {
 public:
-  explicit CEmitter(const Program& program)
+  CEmitter(const Program& program, const EmitOptions& options)
       : m_Program(program),
         m_Graph(program.graph()),
         m_View(program),
         m_Variables(program),
-        m_Statements(m_Variables),
+        m_Statements(m_Variables, options.useRanges),
         m_ArgumentsAtCalls(!detail::isInSSAForm(m_Graph)) {}
 
   EmittedC emit() {
@@ -350,6 +350,6 @@ private:
 
 }  // namespace
 
-EmittedC emitC(const Program& program) { return CEmitter(program).emit(); }
+EmittedC emitC(const Program& program, const EmitOptions& options) { return CEmitter(program, options).emit(); }
 
 }  // namespace ssaopt::client

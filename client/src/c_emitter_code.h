@@ -3,11 +3,14 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <set>
 #include <string>
 #include <unordered_map>
+#include <utility>
 #include <vector>
 
+#include "infix_text.h"
 #include "ssaopt/client/program.h"
 
 namespace ssaopt::client::detail {
@@ -25,8 +28,9 @@ struct CHelper {
 // The helpers of the value arithmetic, each after those it calls.
 const std::vector<CHelper>& cRuntimeHelpers();
 
-// The names in C code, outside comments and string literals, that may name a function of the unit:
-// a helper (ssa_...) or a procedure (proc_..., sys_...), which the program's own names never are.
+// The names in C code, outside comments and string literals, that may name a function or macro of the
+// unit: a helper (ssa_..., SSA_...) or a procedure (proc_..., sys_...), which the program's own names
+// never are.
 std::vector<std::string> functionNamesIn(const std::string& code);
 
 // The text of the helpers that `code` calls, directly or through other helpers, in the order of
@@ -36,6 +40,19 @@ std::string calledHelpersText(const std::vector<const CHelper*>& helpers, const 
 // A C identifier of the program's own that C does not reserve and that the emitter's names
 // (ssa_..., proc_..., sys_...) cannot take.
 bool isFreeCIdentifier(const std::string& name);
+
+// The least and greatest number that an expression can have, as propagation found them, and whether
+// it may be NaN instead (which no range holds, and which no C conversion to an integer takes).
+struct ValueRange {
+  double lo;
+  double hi;
+  bool mayBeNaN;
+};
+
+// Where a value's range makes a check needless, the code leaves the check out and marks the value
+// with the range it relies on: SSA_RANGE(value, lo, hi), or SSA_RANGE_OR_NAN. The mark is the value
+// itself, or, compiled with -DSSA_CHECK_RANGES, a fault where the value lies outside the range.
+std::string rangeMark(const std::string& value, const ValueRange& range);
 
 // How a variable is held in C.
 struct CVariable {
@@ -60,10 +77,19 @@ public:
   std::vector<CVariable>& all() { return m_Variables; }
 
   // The C text that reads the variable as a double, that reads the next value of its input stream,
-  // and that converts `value` as assigning to it stores it.
+  // and that converts `value` as assigning to it stores it; where the value's range (if known) makes
+  // the saturation or the cast needless, without them.
   std::string readText(CVariable& variable);
   std::string inputText(CVariable& variable);
-  std::string storeText(CVariable& variable, const std::string& value);
+  std::string storeText(CVariable& variable, const std::string& value,
+                        const std::optional<ValueRange>& range = std::nullopt);
+  // The same as the text before and after the value.
+  std::pair<std::string, std::string> storeAround(CVariable& variable, const std::optional<ValueRange>& range);
+  // The C text before and after an index that names the element directly, for an index whose range
+  // lies within the array: without the helper that checks the index.
+  std::pair<std::string, std::string> elementAround(CVariable& variable, const ValueRange& index);
+  // Whether the range shows that every index it allows lies within the array.
+  static bool withinArray(const CVariable& variable, const ValueRange& range);
   // The C constant of what assigning `number` to the variable stores.
   std::string storedConstant(CVariable& variable, double number);
   // Whether assigning `number` to the variable stores the value it starts with.
@@ -90,7 +116,8 @@ struct Unemittable {
 // Statements as C lines, each computed value sequenced as the interpreter sequences it.
 class CStatements {
 public:
-  explicit CStatements(CVariables& variables) : m_Variables(variables) {}
+  // With `useRanges`, checks that the propagated ranges make needless are left out.
+  CStatements(CVariables& variables, bool useRanges) : m_Variables(variables), m_UseRanges(useRanges) {}
 
   // A parameter statement that stands in a block: in SSA form, calls pass only these arguments.
   void placeParameter(const KvCCfgParamStatement* pParam) { m_PlacedParameters.insert(pParam); }
@@ -109,10 +136,15 @@ private:
   struct Code {
     std::vector<std::string> prelude;  // declarations of temporaries, in evaluation order
     std::string text;
+    std::optional<ValueRange> range;  // where ranges are used and both bounds are known
   };
 
   static KvCCfgVariable* onlyVariableOf(KvCCfgExpression* pExpression);
   Code expression(KvCCfgExpression* pExpression, bool condition);
+  Code libraryExpression(KvCCfgExpression* pExpression);
+  InfixText::Term elementReadTerm(CVariable& array, const std::optional<ValueRange>& index);
+  InfixText::Term elementWriteTerm(CVariable& array, const std::optional<ValueRange>& index,
+                                   const std::optional<ValueRange>& value);
   Code terms(const KvCCfgSFExpression& expression, bool condition);
   std::vector<std::string> assignment(KvCCfgAssignment& assignment);
   std::vector<std::string> call(KvCCfgProcedureCall& call, const KvCControlFlowGraph& graph,
@@ -120,7 +152,10 @@ private:
   std::vector<std::string> externCall(KvCCfgExternCall& call);
   std::string temporary(const std::string& kind);
 
+  std::optional<ValueRange> rangeOf(const KvCCfgValue& lo, const KvCCfgValue& hi, bool mayBeNaN) const;
+
   CVariables& m_Variables;
+  bool m_UseRanges;
   std::set<const KvCCfgParamStatement*> m_PlacedParameters;
   int m_Temporaries = 0;
 };

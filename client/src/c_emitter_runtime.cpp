@@ -42,7 +42,8 @@ std::vector<std::string> functionNamesIn(const std::string& code) {
     std::size_t start = i;
     while (i < code.size() && isIdentifierCharacter(code[i])) ++i;
     std::string name = code.substr(start, i - start);
-    if (name.rfind("ssa_", 0) == 0 || name.rfind("proc_", 0) == 0 || name.rfind("sys_", 0) == 0)
+    if (name.rfind("ssa_", 0) == 0 || name.rfind("SSA_", 0) == 0 || name.rfind("proc_", 0) == 0 ||
+        name.rfind("sys_", 0) == 0)
       names.push_back(std::move(name));
   }
   return names;
@@ -261,6 +262,35 @@ static inline float ssa_to_float32(double x) {
   if (x > 0x1.fffffep127 || x < -0x1.fffffep127) return x < 0.0 ? -0x1.fffffep127f : 0x1.fffffep127f;
   return (float)x;
 }
+)"},
+      {"ssa_in_range",
+       R"(/* A value whose propagated range made a check needless: the value itself, or, compiled with
+   -DSSA_CHECK_RANGES, a fault where it lies outside that range (or is a NaN that it may not be). */
+#ifdef SSA_CHECK_RANGES
+#include <stdio.h>
+static double ssa_in_range(double x, double lo, double hi, int nan) {
+  static char message[128];
+  if (!(x >= lo && x <= hi) && !(nan && x != x)) {
+    snprintf(message, sizeof message, "%.17g lies outside its propagated range [%.17g, %.17g]", x, lo, hi);
+    ssa_fault(message);
+  }
+  return x;
+}
+#endif
+)"},
+      {"SSA_RANGE",
+       R"(#ifdef SSA_CHECK_RANGES
+#define SSA_RANGE(x, lo, hi) ssa_in_range((x), (lo), (hi), 0)
+#else
+#define SSA_RANGE(x, lo, hi) (x)
+#endif
+)"},
+      {"SSA_RANGE_OR_NAN",
+       R"(#ifdef SSA_CHECK_RANGES
+#define SSA_RANGE_OR_NAN(x, lo, hi) ssa_in_range((x), (lo), (hi), 1)
+#else
+#define SSA_RANGE_OR_NAN(x, lo, hi) (x)
+#endif
 )"},
   };
   return kHelpers;

@@ -9,6 +9,7 @@
 
 #include "c_emitter_code.h"
 #include "infix_text.h"
+#include "ssaopt/client/data_types.h"
 #include "ssaopt/client/numbers.h"
 #include "ssaopt/client/statements.h"
 #include "ssaopt/client/variable.h"
@@ -67,6 +68,34 @@ InfixText::Term operatorTerm(TermOp op, const InfixText::Operand* operands, bool
   return InfixText::Term{std::string(helperOf(op)) + "(", arityOf(op) == 2 ? ", " : "", ")", kAtomPrecedence};
 }
 
+// Reading a variable of a float type or a scaled one may give NaN: nothing in storing converts it.
+bool holdsNaN(KvCCfgVariable* pVariable) {
+  const KvCCfgVariable& original = *originalOf(pVariable);
+  return isFloatType(original.getDataType()) || original.isScaled();
+}
+
+// Whether the sub-expression that `term` ends may be NaN: where it reads one, or where a sum, a
+// difference or a quotient of operands that may be infinite (their range unknown) may give one. The
+// integer view, truth values and sgn give no NaN, and products through ssa_mul none of their own.
+template <class RangeAt>
+bool givesNaN(const KvCCfgSFExpression::Term& term, const std::size_t* operandEnds,
+              const std::vector<bool>& mayBeNaN, RangeAt rangeAt) {
+  if (term.op == TermOp::Literal) return std::isnan(term.number);
+  if (term.op == TermOp::Variable || term.op == TermOp::ElementRead) return holdsNaN(term.pVariable);
+  if (term.op == TermOp::ElementWrite || givesTruthValue(term.op) || isIntegerOperator(term.op) ||
+      term.op == TermOp::Sgn)
+    return false;
+  std::size_t arity = static_cast<std::size_t>(arityOf(term.op));
+  bool makesNaN = term.op == TermOp::Add || term.op == TermOp::Subtract || term.op == TermOp::Divide;
+  for (std::size_t i = 0; i < arity; ++i) {
+    std::optional<ValueRange> operand = rangeAt(operandEnds[i]);
+    if (mayBeNaN[operandEnds[i]] || (makesNaN && (!operand || !std::isfinite(operand->lo) ||
+                                                  !std::isfinite(operand->hi))))
+      return true;
+  }
+  return false;
+}
+
 bool readsInput(const KvCCfgSFExpression::Term& term) {
   return (term.op == TermOp::Variable || term.op == TermOp::ElementRead) && term.pVariable->isVolatile();
 }
@@ -107,9 +136,25 @@ std::string CStatements::temporary(const std::string& kind) {
   return "ssa_" + kind + std::to_string(++m_Temporaries);
 }
 
+std::optional<ValueRange> CStatements::rangeOf(const KvCCfgValue& lo, const KvCCfgValue& hi,
+                                                bool mayBeNaN) const {
+  if (!m_UseRanges || !lo.isConstant() || !hi.isConstant() || !(lo.getValue() <= hi.getValue()))
+    return std::nullopt;
+  return ValueRange{lo.getValue(), hi.getValue(), mayBeNaN};
+}
+
 CStatements::Code CStatements::expression(KvCCfgExpression* pExpression, bool condition) {
   if (!pExpression) throw Unemittable{"an expression is missing"};
   if (KvCCfgSFExpression* pTerms = pExpression->isSFExpression()) return terms(*pTerms, condition);
+  Code code = libraryExpression(pExpression);
+  KvCCfgVariable* pRead = onlyVariableOf(pExpression);
+  bool mayBeNaN = pRead ? holdsNaN(pRead) : std::isnan(pExpression->evaluate().getValue());
+  code.range = rangeOf(pExpression->getMinimum(), pExpression->getMaximum(), mayBeNaN);
+  return code;
+}
+
+// The library's own expressions: a set of variables, or a fixed value.
+CStatements::Code CStatements::libraryExpression(KvCCfgExpression* pExpression) {
   if (auto* pMembers = dynamic_cast<KvCCfgVariableExpression*>(pExpression)) {
     ssaopt::set<KvCCfgVariable*> members = pMembers->getUsedVariables();
     if (members.size() != 1)
@@ -117,19 +162,27 @@ CStatements::Code CStatements::expression(KvCCfgExpression* pExpression, bool co
     CVariable& variable = m_Variables.of(*members.begin());
     if (variable.pVariable->isArray())
       throw Unemittable{"passes the whole array " + quoted(variable.pVariable->getName())};
-    if (variable.pVariable->isVolatile()) return Code{{}, m_Variables.inputText(variable)};
-    return Code{{}, m_Variables.readText(variable)};
+    if (variable.pVariable->isVolatile()) return Code{{}, m_Variables.inputText(variable), std::nullopt};
+    return Code{{}, m_Variables.readText(variable), std::nullopt};
   }
   KvCCfgValue value = pExpression->evaluate();
   if (!dynamic_cast<KvCCfgValueExpression*>(pExpression) || !value.isConstant())
     throw Unemittable{"an expression has no value"};
-  return Code{{}, literalTerm(value.getValue()).before};
+  return Code{{}, literalTerm(value.getValue()).before, std::nullopt};
 }
 
 CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool condition) {
   const KvCCfgSFExpression::Terms& terms = expression.getTerms();
   if (terms.empty()) throw Unemittable{"an expression without terms"};
   bool readsFirst = std::count_if(terms.begin(), terms.end(), readsInput) > 1;
+  std::vector<KvCCfgSFExpression::Bounds> bounds;
+  if (m_UseRanges && !expression.isMarkedAsEvalToNonConst()) bounds = expression.getTermBounds(true);
+  std::vector<bool> mayBeNaN;  // of each term: whether the sub-expression it ends may be NaN
+  // The range of the sub-expression that term `i` ends.
+  auto rangeAt = [&](std::size_t i) {
+    return i < bounds.size() ? rangeOf(bounds[i].first, bounds[i].second, mayBeNaN[i]) : std::nullopt;
+  };
+  std::vector<std::size_t> ends;  // of each piece: the term that ends it
   Code code;
   InfixText text;
   std::vector<bool> readsTemporary;  // of each piece: an input read first into a temporary
@@ -138,6 +191,8 @@ CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool 
     std::size_t arity = static_cast<std::size_t>(arityOf(term.op));
     bool operandsReadTemporary = std::any_of(readsTemporary.end() - static_cast<std::ptrdiff_t>(arity),
                                              readsTemporary.end(), [](bool reads) { return reads; });
+    const std::size_t* operandEnds = ends.data() + (ends.size() - arity);
+    mayBeNaN.push_back(givesNaN(term, operandEnds, mayBeNaN, [&](std::size_t end) { return rangeAt(end); }));
     InfixText::Term result;
     bool resultReadsTemporary = operandsReadTemporary && !readsInput(term);
     if (term.op == TermOp::Literal) {
@@ -165,11 +220,9 @@ CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool 
         std::string read = m_Variables.readText(variable);
         result = InfixText::Term{read, "", "", read[0] == '(' ? kUnaryPrecedence : kAtomPrecedence};
       } else if (term.op == TermOp::ElementRead) {
-        variable.stored = true;
-        result = InfixText::Term{"ssa_read_" + variable.name + "(", "", ")", kAtomPrecedence};
+        result = elementReadTerm(variable, rangeAt(operandEnds[0]));
       } else {
-        variable.stored = true;
-        result = InfixText::Term{"ssa_write_" + variable.name + "(", ", ", ")", 0};
+        result = elementWriteTerm(variable, rangeAt(operandEnds[0]), rangeAt(operandEnds[1]));
       }
     } else {
       result = operatorTerm(term.op, text.operands(arity),
@@ -178,9 +231,35 @@ CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool 
     text.push(arity, result);
     readsTemporary.resize(readsTemporary.size() - arity);
     readsTemporary.push_back(resultReadsTemporary);
+    ends.resize(ends.size() - arity);
+    ends.push_back(i);
   }
   code.text = text.text(text.pieces() - 1);
+  code.range = rangeAt(terms.size() - 1);
   return code;
+}
+
+// An element read through the helper that checks its index, or directly where the index's range lies
+// within the array.
+InfixText::Term CStatements::elementReadTerm(CVariable& array, const std::optional<ValueRange>& index) {
+  array.stored = true;
+  if (!index || !CVariables::withinArray(array, *index))
+    return InfixText::Term{"ssa_read_" + array.name + "(", "", ")", kAtomPrecedence};
+  std::pair<std::string, std::string> element = m_Variables.elementAround(array, *index);
+  if (array.heldAsDouble) return InfixText::Term{element.first, "", element.second, kAtomPrecedence};
+  return InfixText::Term{"(double)" + element.first, "", element.second, kUnaryPrecedence};
+}
+
+// An element write through the helper that checks its index and stores, or as an assignment where the
+// index's range lies within the array.
+InfixText::Term CStatements::elementWriteTerm(CVariable& array, const std::optional<ValueRange>& index,
+                                              const std::optional<ValueRange>& value) {
+  array.stored = true;
+  if (!index || !CVariables::withinArray(array, *index))
+    return InfixText::Term{"ssa_write_" + array.name + "(", ", ", ")", 0};
+  std::pair<std::string, std::string> element = m_Variables.elementAround(array, *index);
+  std::pair<std::string, std::string> store = m_Variables.storeAround(array, value);
+  return InfixText::Term{element.first, element.second + " = " + store.first, store.second, 0};
 }
 
 std::vector<std::string> CStatements::statement(KvCCfgStatement& statement, const KvCControlFlowGraph& graph,
@@ -238,7 +317,8 @@ std::vector<std::string> CStatements::assignment(KvCCfgAssignment& assignment) {
     variable.stored = true;
     return scoped(value.prelude, {"ssa_fill_" + variable.name + "(" + value.text + ");"});
   }
-  return scoped(value.prelude, {variable.name + " = " + m_Variables.storeText(variable, value.text) + ";"});
+  return scoped(value.prelude,
+                {variable.name + " = " + m_Variables.storeText(variable, value.text, value.range) + ";"});
 }
 
 // The arguments go to the formal parameters, all evaluated before any is stored, then the procedure
@@ -273,7 +353,7 @@ std::vector<std::string> CStatements::call(KvCCfgProcedureCall& call, const KvCC
       text = temporary("arg");
       prelude.push_back("double " + text + " = " + value.text + ";");
     }
-    lines.push_back(pFormal->name + " = " + m_Variables.storeText(*pFormal, text) + ";");
+    lines.push_back(pFormal->name + " = " + m_Variables.storeText(*pFormal, text, value.range) + ";");
   }
   lines.push_back(procedureName(callee) + "();");
   return scoped(prelude, lines);

@@ -80,10 +80,23 @@ std::string literalOf(const CVariable& variable, double number) {
   return variable.heldAsDouble || variable.type == "float" ? doubleLiteral(number) : formatNumber(number);
 }
 
-std::string storeCall(const CVariable& variable, const std::string& value) {
-  if (variable.hasStoreHelper) return "ssa_store_" + variable.name + "(" + value + ")";
+using Around = std::pair<std::string, std::string>;
+
+// The text before and after a value that stores it in the variable.
+Around storeCall(const CVariable& variable) {
+  if (variable.hasStoreHelper) return {"ssa_store_" + variable.name + "(", ")"};
   std::string cast = castHelperOf(variable.pVariable->getDataType());
-  return cast.empty() ? value : cast + "(" + value + ")";
+  return cast.empty() ? Around{"", ""} : Around{cast + "(", ")"};
+}
+
+std::string storeCall(const CVariable& variable, const std::string& value) {
+  Around around = storeCall(variable);
+  return around.first + value + around.second;
+}
+
+Around rangeMarkAround(const ValueRange& range) {
+  return {range.mayBeNaN ? "SSA_RANGE_OR_NAN(" : "SSA_RANGE(",
+          ", " + doubleLiteral(range.lo) + ", " + doubleLiteral(range.hi) + ")"};
 }
 
 // The program's name where C allows it; a name C or the emitter reserves gets a prefix, and a name
@@ -152,9 +165,64 @@ std::string CVariables::storedConstant(CVariable& variable, double number) {
   return literalOf(variable, storedValue(*variable.pVariable, number));
 }
 
-std::string CVariables::storeText(CVariable& variable, const std::string& value) {
+std::string rangeMark(const std::string& value, const ValueRange& range) {
+  Around around = rangeMarkAround(range);
+  return around.first + value + around.second;
+}
+
+std::string CVariables::storeText(CVariable& variable, const std::string& value,
+                                  const std::optional<ValueRange>& range) {
+  Around around = storeAround(variable, range);
+  return around.first + value + around.second;
+}
+
+namespace {
+
+// Whether C's conversion of every value in the range to the integer type is defined and truncates as
+// the 32-bit integer view does, so that no wrapping is needed.
+bool convertsExactly(const KV_DataType* pType, const ValueRange& range) {
+  std::optional<double> least = typeMinimum(pType), greatest = typeMaximum(pType);
+  return isIntegerType(pType) && !range.mayBeNaN && least && greatest && range.lo > *least - 1.0 &&
+         range.hi < *greatest + 1.0;
+}
+
+bool withinLimits(const KvCCfgSFVariable& variable, const ValueRange& range) {
+  return (!variable.isUpperBorderSaturated() || range.hi <= variable.getUpperLimit()) &&
+         (!variable.isLowerBorderSaturated() || range.lo >= variable.getLowerLimit());
+}
+
+}  // namespace
+
+Around CVariables::storeAround(CVariable& variable, const std::optional<ValueRange>& range) {
   variable.stored = true;
-  return storeCall(variable, value);
+  const KvCCfgSFVariable& declared = *variable.pVariable;
+  bool saturated = declared.isUpperBorderSaturated() || declared.isLowerBorderSaturated();
+  bool castNeedless = range && !variable.heldAsDouble && convertsExactly(declared.getDataType(), *range);
+  if (!range || (saturated ? !withinLimits(declared, *range) : !castNeedless))
+    return storeCall(variable);
+  // What is left of the store once the saturation is needless, around the marked value. A NaN passes
+  // a saturation unchanged, so the saturation is needless whether or not the value may be NaN.
+  Around marked = rangeMarkAround(*range);
+  std::string cast = castHelperOf(declared.getDataType());
+  if (declared.isScaled() && declared.getScaling()->getLSB() != 0.0) {
+    const KV_Scaling& scaling = *declared.getScaling();
+    return {"ssa_represent(" + marked.first, marked.second + ", " + doubleLiteral(scaling.getLSB()) + ", " +
+                                                 doubleLiteral(scaling.getOffset()) + ")"};
+  }
+  if (declared.isScaled() || cast.empty()) return marked;
+  if (castNeedless) return {"(" + variable.type + ")" + marked.first, marked.second};
+  return {cast + "(" + marked.first, marked.second + ")"};
+}
+
+bool CVariables::withinArray(const CVariable& variable, const ValueRange& range) {
+  return !range.mayBeNaN && range.lo > -1.0 &&
+         range.hi < static_cast<double>(variable.pVariable->getArrayLength());
+}
+
+Around CVariables::elementAround(CVariable& variable, const ValueRange& index) {
+  variable.stored = true;
+  Around marked = rangeMarkAround(index);
+  return {variable.name + "[(int32_t)" + marked.first, marked.second + "]"};
 }
 
 bool CVariables::storesInitialValue(const CVariable& variable, double number) {

@@ -20,11 +20,13 @@ bool defines(const std::string& text, const std::string& function) {
 
 class EmittingC : public clienttest::ClientTest {
 protected:
-  ssaopt::client::EmittedC emit(const std::string& text, const std::vector<std::string>& pipeline = {}) {
+  // With every check, unless `useRanges`.
+  ssaopt::client::EmittedC emit(const std::string& text, const std::vector<std::string>& pipeline = {},
+                                bool useRanges = false) {
     ssaopt::client::Program* pProgram = load(text);
     if (!pProgram) return {};
     ssaopt::tool::runPipeline(pipeline, *pProgram);
-    return ssaopt::client::emitC(*pProgram);
+    return ssaopt::client::emitC(*pProgram, ssaopt::client::EmitOptions{useRanges});
   }
 };
 
@@ -182,6 +184,53 @@ TEST_F(EmittingC, ConstantConditionsAreCsTruthValues) {
                          .text;
   EXPECT_TRUE(contains(text, "  if (1) goto a;\n"));
   EXPECT_TRUE(contains(text, "  if (0) goto b;\n"));
+}
+
+TEST_F(EmittingC, ChecksThatRangesShowToBeNeedlessAreLeftOut) {
+  // Declared bounds (k, a) and propagated ranges (i in [3, 5] after the branch, x = f * 5 in [1, 4])
+  // make saturations, wrapping casts and index checks needless; the value is marked with the range it
+  // relies on. A value that may be NaN keeps its cast: C's conversion of a NaN to an integer is
+  // undefined.
+  std::string program =
+      "var int8 a volatile;\n"
+      "var uint8 k volatile saturate(0..5);\n"
+      "var float64 g volatile saturate(0.2..0.8);\n"
+      "var bool in volatile;\n"
+      "var int16 x = 0;\n"
+      "var int16 s saturate(0..100) = 0;\n"
+      "var int16 t scale(0.5) saturate(-10..10) = 0;\n"
+      "var float64 f saturate(0..1) = 0;\n"
+      "var int16 tab[6] = 0;\n"
+      "var uint8 i = 0;\n"
+      "var int16 y output = 0;\n"
+      "proc #main {\n"
+      "  x = a + 1;\n"
+      "  s = k * 10;\n"
+      "  t = k;\n"
+      "  tab[k] = s;\n"
+      "  s = a * 10;\n"
+      "  f = g;\n"
+      "  x = f * 5;\n"
+      "  i = 3;\n"
+      "  if in goto five else read;\n"
+      "five:\n"
+      "  i = 5;\n"
+      "read:\n"
+      "  y = tab[i] + tab[x];\n"
+      "}\n";
+  std::string text = emit(program, {"ssa", "divide", "sccp"}, true).text;
+  EXPECT_TRUE(contains(text,
+                       "  x = (int16_t)SSA_RANGE(ssa_input_a() + 1.0, -127.0, 128.0);\n"
+                       "  s = (int16_t)SSA_RANGE(ssa_mul(ssa_input_k(), 10.0), 0.0, 50.0);\n"
+                       "  t = ssa_represent(SSA_RANGE(ssa_input_k(), 0.0, 5.0), 0.5, 0.0);\n"
+                       "  tab[(int32_t)SSA_RANGE(ssa_input_k(), 0.0, 5.0)] = (int16_t)SSA_RANGE((double)s, 0.0, 50.0);\n"
+                       "  s = ssa_store_s(ssa_mul(ssa_input_a(), 10.0));\n"
+                       "  f = SSA_RANGE_OR_NAN(ssa_input_g(), 0.2, 0.8);\n"
+                       "  x = ssa_to_int16(ssa_mul(f, 5.0));\n"));
+  EXPECT_TRUE(contains(text, "  y = ssa_to_int16((double)tab[(int32_t)SSA_RANGE((double)i, 3.0, 5.0)] + "
+                             "(double)tab[(int32_t)SSA_RANGE((double)x, 1.0, 4.0)]);\n"));
+  EXPECT_TRUE(contains(text, "#define SSA_RANGE(x, lo, hi) (x)\n"));
+  EXPECT_FALSE(contains(emit(program, {"ssa", "divide", "sccp"}, false).text, "SSA_RANGE"));
 }
 
 }  // namespace

@@ -140,8 +140,12 @@ TEST(ToolEmitC, NoCompilerFusesTheRoundedProductsOfScaledStores) {
 TEST(ToolEmitC, WritesTheCOfTheOptimisedProgram) {
   Result result = ssaopt("--emit=c " + example("typical_run"));
   EXPECT_EQ(result.status, 0) << result.err;
-  EXPECT_NE(result.out.find("  command = ssa_to_int16(ssa_input_speed());\n"), std::string::npos)
+  EXPECT_NE(result.out.find("  command = (int16_t)SSA_RANGE(ssa_input_speed(), -32768.0, 32767.0);\n"),
+            std::string::npos)
       << result.out;
+  Result checked = ssaopt("--emit=c --keep-checks " + example("typical_run"));
+  EXPECT_NE(checked.out.find("  command = ssa_to_int16(ssa_input_speed());\n"), std::string::npos)
+      << checked.out;
   EXPECT_EQ(result.out.find("limitCommand"), std::string::npos) << "inlined, so gone";
 }
 

@@ -38,6 +38,12 @@ struct EmittedC {
   std::vector<EmittedInput> inputs;  // in declaration order
 };
 
-EmittedC emitC(const Program& program);
+struct EmitOptions {
+  // Leave out a saturation, a cast or an index check where the range that propagation left in the
+  // variables shows that it cannot change the value (see rangeMark in the emitted text).
+  bool useRanges = true;
+};
+
+EmittedC emitC(const Program& program, const EmitOptions& options = {});
 
 }  // namespace ssaopt::client
