@@ -44,8 +44,9 @@ public:
         m_Graph(program.graph()),
         m_View(program),
         m_Variables(program),
-        m_Statements(m_Variables, options.useRanges),
-        m_ArgumentsAtCalls(!detail::isInSSAForm(m_Graph)) {}
+        m_ArgumentsAtCalls(!detail::isInSSAForm(m_Graph)),
+        // Ranges are those that propagation leaves in the SSA versions; a program as written has none.
+        m_Statements(m_Variables, options.useRanges && !m_ArgumentsAtCalls) {}
 
   EmittedC emit() {
     findPlacedParameters();
@@ -343,8 +344,8 @@ private:
   const KvCControlFlowGraph& m_Graph;
   detail::ProgramView m_View;
   detail::CVariables m_Variables;
-  CStatements m_Statements;
   bool m_ArgumentsAtCalls;
+  CStatements m_Statements;
   std::unordered_set<const KvCCfgStatement*> m_RedundantStores;
 };
 

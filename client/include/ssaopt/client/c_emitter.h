@@ -39,8 +39,9 @@ struct EmittedC {
 };
 
 struct EmitOptions {
-  // Leave out a saturation, a cast or an index check where the range that propagation left in the
-  // variables shows that it cannot change the value (see rangeMark in the emitted text).
+  // In SSA form, leave out a saturation, a wrapping cast or an index check where the range that
+  // propagation left in the versions shows that it cannot change the value; the value is marked with
+  // that range (SSA_RANGE), which the code checks when compiled with -DSSA_CHECK_RANGES.
   bool useRanges = true;
 };
 
