@@ -54,6 +54,11 @@ struct ValueRange {
 // itself, or, compiled with -DSSA_CHECK_RANGES, a fault where the value lies outside the range.
 std::string rangeMark(const std::string& value, const ValueRange& range);
 
+// The text before and after a number that gives its 32-bit integer view, on which the integer
+// operators, element accesses and integer casts work: ssa_int(x), or a direct conversion where the
+// range shows it to be defined.
+std::pair<std::string, std::string> integerViewAround(const std::optional<ValueRange>& range);
+
 // How a variable is held in C.
 struct CVariable {
   const KvCCfgSFVariable* pVariable = nullptr;

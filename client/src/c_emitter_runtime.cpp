@@ -110,8 +110,10 @@ static inline int32_t ssa_signed(uint32_t bits) {
 }
 )"},
       {"ssa_int",
-       R"(/* The 32-bit integer view of a number: truncated toward zero to 64 bits, the low 32 bits read as
-   signed; 0 outside the 64-bit range and for NaN, where the conversion would be undefined. */
+       R"(/* The 32-bit integer view of a number, on which the integer operators and casts work: truncated
+   toward zero to 64 bits, the low 32 bits read as signed; 0 outside the 64-bit range and for NaN,
+   where the conversion would be undefined. Where a range shows a number to lie within the 32-bit
+   range, the code converts it directly instead. */
 static inline int32_t ssa_int(double x) {
   if (!(x >= -9223372036854775808.0 && x < 9223372036854775808.0)) return 0;
   return ssa_signed((uint32_t)(uint64_t)(int64_t)x);
@@ -139,36 +141,34 @@ static inline double ssa_div(double a, double b) {
 )"},
       {"ssa_rem",
        R"(/* A remainder without a 32-bit result (x % 0, INT32_MIN % -1) gives 0. */
-static inline double ssa_rem(double a, double b) {
-  int32_t x = ssa_int(a), y = ssa_int(b);
+static inline double ssa_rem(int32_t x, int32_t y) {
   if (y == 0 || (x == INT32_MIN && y == -1)) return 0.0;
   return (double)(x % y);
 }
 )"},
       {"ssa_shl",
        R"(/* Shift counts are taken modulo 32; the right shift copies the sign bit in. */
-static inline double ssa_shl(double a, double b) {
-  return (double)ssa_signed((uint32_t)ssa_int(a) << ((uint32_t)ssa_int(b) & 31u));
+static inline double ssa_shl(int32_t x, int32_t places) {
+  return (double)ssa_signed((uint32_t)x << ((uint32_t)places & 31u));
 }
 )"},
       {"ssa_shr",
-       R"(static inline double ssa_shr(double a, double b) {
-  int32_t x = ssa_int(a);
-  uint32_t places = (uint32_t)ssa_int(b) & 31u;
-  return (double)(x >= 0 ? x >> places : ~(~x >> places));
+       R"(static inline double ssa_shr(int32_t x, int32_t places) {
+  uint32_t count = (uint32_t)places & 31u;
+  return (double)(x >= 0 ? x >> count : ~(~x >> count));
 }
 )"},
       {"ssa_bitand",
-       R"(static inline double ssa_bitand(double a, double b) { return (double)(ssa_int(a) & ssa_int(b)); }
+       R"(static inline double ssa_bitand(int32_t a, int32_t b) { return (double)(a & b); }
 )"},
       {"ssa_bitor",
-       R"(static inline double ssa_bitor(double a, double b) { return (double)(ssa_int(a) | ssa_int(b)); }
+       R"(static inline double ssa_bitor(int32_t a, int32_t b) { return (double)(a | b); }
 )"},
       {"ssa_bitxor",
-       R"(static inline double ssa_bitxor(double a, double b) { return (double)(ssa_int(a) ^ ssa_int(b)); }
+       R"(static inline double ssa_bitxor(int32_t a, int32_t b) { return (double)(a ^ b); }
 )"},
       {"ssa_compl",
-       R"(static inline double ssa_compl(double a) { return (double)~ssa_int(a); }
+       R"(static inline double ssa_compl(int32_t a) { return (double)~a; }
 )"},
       {"ssa_and",
        R"(/* Both operands are evaluated: && and || of the program do not short-circuit. */
@@ -224,9 +224,9 @@ static inline double ssa_represent(double x, double lsb, double offset) {
 }
 )"},
       {"ssa_wrap",
-       R"(/* The low `width` bits of the integer view, read as signed or unsigned. */
-static inline double ssa_wrap(double x, int width, int is_signed) {
-  uint32_t low = (uint32_t)ssa_int(x) & (0xFFFFFFFFu >> (32 - width));
+       R"(/* The low `width` bits of an integer view, read as signed or unsigned. */
+static inline double ssa_wrap(int32_t view, int width, int is_signed) {
+  uint32_t low = (uint32_t)view & (0xFFFFFFFFu >> (32 - width));
   int negative = is_signed && (low >> (width - 1)) != 0;
   return (double)low - (negative ? (double)((uint64_t)1 << width) : 0.0);
 }
@@ -235,22 +235,22 @@ static inline double ssa_wrap(double x, int width, int is_signed) {
        R"(static inline _Bool ssa_to_bool(double x) { return x != 0.0; }
 )"},
       {"ssa_to_int8",
-       R"(static inline int8_t ssa_to_int8(double x) { return (int8_t)ssa_wrap(x, 8, 1); }
+       R"(static inline int8_t ssa_to_int8(int32_t view) { return (int8_t)ssa_wrap(view, 8, 1); }
 )"},
       {"ssa_to_uint8",
-       R"(static inline uint8_t ssa_to_uint8(double x) { return (uint8_t)ssa_wrap(x, 8, 0); }
+       R"(static inline uint8_t ssa_to_uint8(int32_t view) { return (uint8_t)ssa_wrap(view, 8, 0); }
 )"},
       {"ssa_to_int16",
-       R"(static inline int16_t ssa_to_int16(double x) { return (int16_t)ssa_wrap(x, 16, 1); }
+       R"(static inline int16_t ssa_to_int16(int32_t view) { return (int16_t)ssa_wrap(view, 16, 1); }
 )"},
       {"ssa_to_uint16",
-       R"(static inline uint16_t ssa_to_uint16(double x) { return (uint16_t)ssa_wrap(x, 16, 0); }
+       R"(static inline uint16_t ssa_to_uint16(int32_t view) { return (uint16_t)ssa_wrap(view, 16, 0); }
 )"},
       {"ssa_to_int32",
-       R"(static inline int32_t ssa_to_int32(double x) { return (int32_t)ssa_wrap(x, 32, 1); }
+       R"(static inline int32_t ssa_to_int32(int32_t view) { return (int32_t)ssa_wrap(view, 32, 1); }
 )"},
       {"ssa_to_uint32",
-       R"(static inline uint32_t ssa_to_uint32(double x) { return (uint32_t)ssa_wrap(x, 32, 0); }
+       R"(static inline uint32_t ssa_to_uint32(int32_t view) { return (uint32_t)ssa_wrap(view, 32, 0); }
 )"},
       {"ssa_to_float32",
        R"(/* Rounds to the nearest float. The plain conversion is undefined outside the float range, so what

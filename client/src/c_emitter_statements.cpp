@@ -68,6 +68,15 @@ InfixText::Term operatorTerm(TermOp op, const InfixText::Operand* operands, bool
   return InfixText::Term{std::string(helperOf(op)) + "(", arityOf(op) == 2 ? ", " : "", ")", kAtomPrecedence};
 }
 
+// An integer operator's helper takes the integer views of its operands.
+InfixText::Term integerOperatorTerm(TermOp op, const std::optional<ValueRange>* operandRanges) {
+  std::pair<std::string, std::string> first = integerViewAround(operandRanges[0]);
+  std::string before = std::string(helperOf(op)) + "(" + first.first;
+  if (arityOf(op) == 1) return InfixText::Term{before, "", first.second + ")", kAtomPrecedence};
+  std::pair<std::string, std::string> second = integerViewAround(operandRanges[1]);
+  return InfixText::Term{before, first.second + ", " + second.first, second.second + ")", kAtomPrecedence};
+}
+
 // Reading a variable of a float type or a scaled one may give NaN: nothing in storing converts it.
 bool holdsNaN(KvCCfgVariable* pVariable) {
   const KvCCfgVariable& original = *originalOf(pVariable);
@@ -224,6 +233,10 @@ CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool 
       } else {
         result = elementWriteTerm(variable, rangeAt(operandEnds[0]), rangeAt(operandEnds[1]));
       }
+    } else if (isIntegerOperator(term.op)) {
+      std::optional<ValueRange> operandRanges[2] = {rangeAt(operandEnds[0]),
+                                                    arity > 1 ? rangeAt(operandEnds[1]) : std::nullopt};
+      result = integerOperatorTerm(term.op, operandRanges);
     } else {
       result = operatorTerm(term.op, text.operands(arity),
                             condition && i + 1 == terms.size() && isComparison(term.op));
@@ -243,8 +256,10 @@ CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool 
 // within the array.
 InfixText::Term CStatements::elementReadTerm(CVariable& array, const std::optional<ValueRange>& index) {
   array.stored = true;
-  if (!index || !CVariables::withinArray(array, *index))
-    return InfixText::Term{"ssa_read_" + array.name + "(", "", ")", kAtomPrecedence};
+  if (!index || !CVariables::withinArray(array, *index)) {
+    std::pair<std::string, std::string> view = integerViewAround(index);
+    return InfixText::Term{"ssa_read_" + array.name + "(" + view.first, "", view.second + ")", kAtomPrecedence};
+  }
   std::pair<std::string, std::string> element = m_Variables.elementAround(array, *index);
   if (array.heldAsDouble) return InfixText::Term{element.first, "", element.second, kAtomPrecedence};
   return InfixText::Term{"(double)" + element.first, "", element.second, kUnaryPrecedence};
@@ -255,8 +270,10 @@ InfixText::Term CStatements::elementReadTerm(CVariable& array, const std::option
 InfixText::Term CStatements::elementWriteTerm(CVariable& array, const std::optional<ValueRange>& index,
                                               const std::optional<ValueRange>& value) {
   array.stored = true;
-  if (!index || !CVariables::withinArray(array, *index))
-    return InfixText::Term{"ssa_write_" + array.name + "(", ", ", ")", 0};
+  if (!index || !CVariables::withinArray(array, *index)) {
+    std::pair<std::string, std::string> view = integerViewAround(index);
+    return InfixText::Term{"ssa_write_" + array.name + "(" + view.first, view.second + ", ", ")", 0};
+  }
   std::pair<std::string, std::string> element = m_Variables.elementAround(array, *index);
   std::pair<std::string, std::string> store = m_Variables.storeAround(array, value);
   return InfixText::Term{element.first, element.second + " = " + store.first, store.second, 0};

@@ -1,6 +1,7 @@
 // The program's variables in C: their identifiers, the C type each is held in, and the helpers that
 // store, index, observe and refill them as the interpreter does.
 #include <cmath>
+#include <cstdint>
 #include <set>
 #include <sstream>
 
@@ -47,11 +48,6 @@ const char* cTypeOf(const KV_DataType* pType) {
   return "double";
 }
 
-// The helper that casts a double to the type; empty for double itself.
-std::string castHelperOf(const KV_DataType* pType) {
-  if (pType == KV_DataType::float64() || cTypeOf(pType) == std::string("double")) return "";
-  return std::string("ssa_to_") + nameOfDataType(pType);
-}
 
 bool sameBits(double a, double b) { return a == b && std::signbit(a) == std::signbit(b); }
 
@@ -82,21 +78,38 @@ std::string literalOf(const CVariable& variable, double number) {
 
 using Around = std::pair<std::string, std::string>;
 
-// The text before and after a value that stores it in the variable.
-Around storeCall(const CVariable& variable) {
-  if (variable.hasStoreHelper) return {"ssa_store_" + variable.name + "(", ")"};
-  std::string cast = castHelperOf(variable.pVariable->getDataType());
-  return cast.empty() ? Around{"", ""} : Around{cast + "(", ")"};
-}
-
-std::string storeCall(const CVariable& variable, const std::string& value) {
-  Around around = storeCall(variable);
-  return around.first + value + around.second;
+Around around(const Around& outer, const Around& inner) {
+  return {outer.first + inner.first, inner.second + outer.second};
 }
 
 Around rangeMarkAround(const ValueRange& range) {
   return {range.mayBeNaN ? "SSA_RANGE_OR_NAN(" : "SSA_RANGE(",
           ", " + doubleLiteral(range.lo) + ", " + doubleLiteral(range.hi) + ")"};
+}
+
+// Whether C's conversion of every number in the range to an integer type from `least` to `greatest`
+// is defined, truncating as the integer view does.
+bool convertsWithin(const ValueRange& range, double least, double greatest) {
+  return !range.mayBeNaN && range.lo > least - 1.0 && range.hi < greatest + 1.0;
+}
+
+// What converts a value to the type: the cast helpers of integer types take its integer view.
+Around castAround(const KV_DataType* pType, const std::optional<ValueRange>& range) {
+  if (pType == KV_DataType::float64() || cTypeOf(pType) == std::string("double")) return {"", ""};
+  std::string helper = std::string("ssa_to_") + nameOfDataType(pType) + "(";
+  if (!isIntegerType(pType)) return {helper, ")"};
+  return around({helper, ")"}, integerViewAround(range));
+}
+
+// The text before and after a value that stores it in the variable.
+Around storeCall(const CVariable& variable) {
+  if (variable.hasStoreHelper) return {"ssa_store_" + variable.name + "(", ")"};
+  return castAround(variable.pVariable->getDataType(), std::nullopt);
+}
+
+std::string storeCall(const CVariable& variable, const std::string& value) {
+  Around store = storeCall(variable);
+  return store.first + value + store.second;
 }
 
 // The program's name where C allows it; a name C or the emitter reserves gets a prefix, and a name
@@ -166,24 +179,28 @@ std::string CVariables::storedConstant(CVariable& variable, double number) {
 }
 
 std::string rangeMark(const std::string& value, const ValueRange& range) {
-  Around around = rangeMarkAround(range);
-  return around.first + value + around.second;
+  Around mark = rangeMarkAround(range);
+  return mark.first + value + mark.second;
+}
+
+Around integerViewAround(const std::optional<ValueRange>& range) {
+  if (range && convertsWithin(*range, INT32_MIN, INT32_MAX))
+    return around({"(int32_t)", ""}, rangeMarkAround(*range));
+  return {"ssa_int(", ")"};
 }
 
 std::string CVariables::storeText(CVariable& variable, const std::string& value,
                                   const std::optional<ValueRange>& range) {
-  Around around = storeAround(variable, range);
-  return around.first + value + around.second;
+  Around store = storeAround(variable, range);
+  return store.first + value + store.second;
 }
 
 namespace {
 
-// Whether C's conversion of every value in the range to the integer type is defined and truncates as
-// the 32-bit integer view does, so that no wrapping is needed.
+// Whether the type holds every number of the range once truncated, so that no wrapping is needed.
 bool convertsExactly(const KV_DataType* pType, const ValueRange& range) {
   std::optional<double> least = typeMinimum(pType), greatest = typeMaximum(pType);
-  return isIntegerType(pType) && !range.mayBeNaN && least && greatest && range.lo > *least - 1.0 &&
-         range.hi < *greatest + 1.0;
+  return isIntegerType(pType) && least && greatest && convertsWithin(range, *least, *greatest);
 }
 
 bool withinLimits(const KvCCfgSFVariable& variable, const ValueRange& range) {
@@ -197,21 +214,23 @@ Around CVariables::storeAround(CVariable& variable, const std::optional<ValueRan
   variable.stored = true;
   const KvCCfgSFVariable& declared = *variable.pVariable;
   bool saturated = declared.isUpperBorderSaturated() || declared.isLowerBorderSaturated();
-  bool castNeedless = range && !variable.heldAsDouble && convertsExactly(declared.getDataType(), *range);
-  if (!range || (saturated ? !withinLimits(declared, *range) : !castNeedless))
-    return storeCall(variable);
-  // What is left of the store once the saturation is needless, around the marked value. A NaN passes
-  // a saturation unchanged, so the saturation is needless whether or not the value may be NaN.
-  Around marked = rangeMarkAround(*range);
-  std::string cast = castHelperOf(declared.getDataType());
-  if (declared.isScaled() && declared.getScaling()->getLSB() != 0.0) {
+  if (!range || (saturated && !withinLimits(declared, *range))) return storeCall(variable);
+  // The saturation, if any, is needless: a NaN passes a saturation unchanged, so whether the value may
+  // be NaN does not matter. What is left converts the value; the value is marked with its range where
+  // the code relies on it.
+  Around leftOut = saturated ? rangeMarkAround(*range) : Around{"", ""};
+  if (declared.isScaled()) {
     const KV_Scaling& scaling = *declared.getScaling();
-    return {"ssa_represent(" + marked.first, marked.second + ", " + doubleLiteral(scaling.getLSB()) + ", " +
-                                                 doubleLiteral(scaling.getOffset()) + ")"};
+    if (scaling.getLSB() == 0.0) return leftOut;
+    return around({"ssa_represent(", ", " + doubleLiteral(scaling.getLSB()) + ", " +
+                                         doubleLiteral(scaling.getOffset()) + ")"},
+                  leftOut);
   }
-  if (declared.isScaled() || cast.empty()) return marked;
-  if (castNeedless) return {"(" + variable.type + ")" + marked.first, marked.second};
-  return {cast + "(" + marked.first, marked.second + ")"};
+  if (!variable.heldAsDouble && convertsExactly(declared.getDataType(), *range))
+    return around({"(" + variable.type + ")", ""}, rangeMarkAround(*range));
+  Around cast = castAround(declared.getDataType(), range);
+  bool castMarks = cast.first.find("SSA_RANGE") != std::string::npos;
+  return castMarks ? cast : around(cast, leftOut);
 }
 
 bool CVariables::withinArray(const CVariable& variable, const ValueRange& range) {
@@ -221,8 +240,7 @@ bool CVariables::withinArray(const CVariable& variable, const ValueRange& range)
 
 Around CVariables::elementAround(CVariable& variable, const ValueRange& index) {
   variable.stored = true;
-  Around marked = rangeMarkAround(index);
-  return {variable.name + "[(int32_t)" + marked.first, marked.second + "]"};
+  return around({variable.name + "[(int32_t)", "]"}, rangeMarkAround(index));
 }
 
 bool CVariables::storesInitialValue(const CVariable& variable, double number) {
@@ -267,8 +285,8 @@ std::string unsaturatedStore(const CVariable& variable) {
     return "ssa_represent(x, " + doubleLiteral(scaling.getLSB()) + ", " + doubleLiteral(scaling.getOffset()) +
            ")";
   }
-  std::string cast = castHelperOf(declared.getDataType());
-  return cast.empty() ? "x" : cast + "(x)";
+  Around cast = castAround(declared.getDataType(), std::nullopt);
+  return cast.first + "x" + cast.second;
 }
 
 CHelper storeHelper(const CVariable& variable) {
@@ -291,8 +309,8 @@ CHelper storeHelper(const CVariable& variable) {
 // The streams give values the variable holds already; only the C type needs converting.
 std::string refilledValue(const CVariable& variable, const std::string& hook) {
   if (variable.heldAsDouble) return hook + "()";
-  std::string cast = castHelperOf(variable.pVariable->getDataType());
-  return cast.empty() ? hook + "()" : cast + "(" + hook + "())";
+  Around cast = castAround(variable.pVariable->getDataType(), std::nullopt);
+  return cast.first + hook + "()" + cast.second;
 }
 
 void addArrayHelpers(const CVariable& variable, const std::string& hook, std::vector<CHelper>& helpers) {
@@ -303,12 +321,10 @@ void addArrayHelpers(const CVariable& variable, const std::string& hook, std::ve
   std::string element = variable.heldAsDouble ? name + "[ssa_i]" : "(double)" + name + "[ssa_i]";
   std::string loop = "  int ssa_i;\n  for (ssa_i = 0; ssa_i < " + length + "; ++ssa_i) ";
   helpers.push_back({"ssa_read_" + name, "static inline double ssa_read_" + name +
-                                             "(double ssa_at) {\n  int32_t ssa_i = ssa_int(ssa_at);\n"
-                                             "  return ssa_i >= 0 && ssa_i < " +
-                                             length + " ? " + element + " : 0.0;\n}\n"});
+                                             "(int32_t ssa_i) {\n  return ssa_i >= 0 && ssa_i < " + length +
+                                             " ? " + element + " : 0.0;\n}\n"});
   helpers.push_back({"ssa_write_" + name, "static inline void ssa_write_" + name +
-                                              "(double ssa_at, double ssa_new) {\n"
-                                              "  int32_t ssa_i = ssa_int(ssa_at);\n  if (ssa_i >= 0 && ssa_i < " +
+                                              "(int32_t ssa_i, double ssa_new) {\n  if (ssa_i >= 0 && ssa_i < " +
                                               length + ") " + name + "[ssa_i] = " + store + ";\n}\n"});
   helpers.push_back({"ssa_fill_" + name, "static inline void ssa_fill_" + name + "(double ssa_new) {\n" + loop +
                                              name + "[ssa_i] = " + store + ";\n}\n"});

@@ -50,7 +50,7 @@ TEST_F(EmittingC, VariablesAreGlobalsOfTheirTypesAndStoresGoThroughTheirHelpers)
   EXPECT_TRUE(contains(text, "  if (x > 100.0) {\n    x = 100.0;\n    saturated = 1;\n  }\n"));
   EXPECT_TRUE(contains(text, "  return ssa_represent(x, 0.5, 0.0);\n"));
   EXPECT_TRUE(contains(text, "level = ssa_store_level(level + (double)mode);\n"));
-  EXPECT_TRUE(contains(text, "ssa_write_table((double)mode, ssa_mul((double)gain, 2.0));\n"));
+  EXPECT_TRUE(contains(text, "ssa_write_table(ssa_int((double)mode), ssa_mul((double)gain, 2.0));\n"));
 }
 
 TEST_F(EmittingC, InputsAreReadInTheInterpretersOrderThroughTheirHooks) {
@@ -67,9 +67,9 @@ TEST_F(EmittingC, InputsAreReadInTheInterpretersOrderThroughTheirHooks) {
                        "  {\n"
                        "    double ssa_in1 = ssa_input_in();\n"
                        "    double ssa_in2 = ssa_input_in();\n"
-                       "    x = ssa_to_int16(ssa_in1 - ssa_in2);\n"
+                       "    x = ssa_to_int16(ssa_int(ssa_in1 - ssa_in2));\n"
                        "  }\n"));
-  EXPECT_TRUE(contains(emitted.text, "  x = ssa_to_int16(ssa_input_other());\n"));
+  EXPECT_TRUE(contains(emitted.text, "  x = ssa_to_int16(ssa_int(ssa_input_other()));\n"));
   ASSERT_EQ(emitted.inputs.size(), 2u);
   EXPECT_EQ(emitted.inputs[0].variable, "in");
   EXPECT_EQ(emitted.inputs[1].hook, "ssa_input_other");
@@ -97,8 +97,8 @@ TEST_F(EmittingC, CallsAssignTheirArgumentsAndMainBecomesAStepFunction) {
     EXPECT_TRUE(contains(text,
                          "    double ssa_arg1 = (double)total;\n"
                          "    double ssa_arg2 = 2.0;\n"
-                         "    a = ssa_to_int16(ssa_arg1);\n"
-                         "    b = ssa_to_int16(ssa_arg2);\n"
+                         "    a = ssa_to_int16(ssa_int(ssa_arg1));\n"
+                         "    b = ssa_to_int16(ssa_int(ssa_arg2));\n"
                          "    proc_add();\n"));
     EXPECT_TRUE(contains(text,
                          "  ssa_extern_begin(\"report\");\n  ssa_value(\"total\", (double)total);\n"
@@ -162,9 +162,9 @@ TEST_F(EmittingC, StatementsThatChangeNothingGenerateNoCode) {
   EXPECT_TRUE(contains(text,
                        "  if (ssa_resume == 2) goto bb6;\n"
                        "bb0:\n"
-                       "  b = ssa_to_int16((double)a + ssa_input_in());\n"
+                       "  b = ssa_to_int16(ssa_int((double)a + ssa_input_in()));\n"
                        "  p = 7;\n"
-                       "  b = ssa_to_int16((double)p);\n"
+                       "  b = ssa_to_int16(ssa_int((double)p));\n"
                        "  return 1;"));
   EXPECT_FALSE(contains(text, " f = ")) << "f is neither read nor written";
   EXPECT_FALSE(contains(text, "static double f")) << "nor declared";
@@ -188,9 +188,9 @@ TEST_F(EmittingC, ConstantConditionsAreCsTruthValues) {
 
 TEST_F(EmittingC, ChecksThatRangesShowToBeNeedlessAreLeftOut) {
   // Declared bounds (k, a) and propagated ranges (i in [3, 5] after the branch, x = f * 5 in [1, 4])
-  // make saturations, wrapping casts and index checks needless; the value is marked with the range it
-  // relies on. A value that may be NaN keeps its cast: C's conversion of a NaN to an integer is
-  // undefined.
+  // make saturations, wrapping casts, index checks and the checks of integer views needless; the value
+  // is marked with the range it relies on. A value that may be NaN keeps its checks: C's conversion of
+  // a NaN to an integer is undefined.
   std::string program =
       "var int8 a volatile;\n"
       "var uint8 k volatile saturate(0..5);\n"
@@ -226,9 +226,10 @@ TEST_F(EmittingC, ChecksThatRangesShowToBeNeedlessAreLeftOut) {
                        "  tab[(int32_t)SSA_RANGE(ssa_input_k(), 0.0, 5.0)] = (int16_t)SSA_RANGE((double)s, 0.0, 50.0);\n"
                        "  s = ssa_store_s(ssa_mul(ssa_input_a(), 10.0));\n"
                        "  f = SSA_RANGE_OR_NAN(ssa_input_g(), 0.2, 0.8);\n"
-                       "  x = ssa_to_int16(ssa_mul(f, 5.0));\n"));
-  EXPECT_TRUE(contains(text, "  y = ssa_to_int16((double)tab[(int32_t)SSA_RANGE((double)i, 3.0, 5.0)] + "
-                             "(double)tab[(int32_t)SSA_RANGE((double)x, 1.0, 4.0)]);\n"));
+                       "  x = ssa_to_int16(ssa_int(ssa_mul(f, 5.0)));\n"));
+  // The sum may leave int16 but not the 32-bit range: it wraps, from its integer view without check.
+  EXPECT_TRUE(contains(text, "  y = ssa_to_int16((int32_t)SSA_RANGE((double)tab[(int32_t)SSA_RANGE((double)i, 3.0, "
+                             "5.0)] + (double)tab[(int32_t)SSA_RANGE((double)x, 1.0, 4.0)], -65536.0, 65534.0));\n"));
   EXPECT_TRUE(contains(text, "#define SSA_RANGE(x, lo, hi) (x)\n"));
   EXPECT_FALSE(contains(emit(program, {"ssa", "divide", "sccp"}, false).text, "SSA_RANGE"));
 }

@@ -144,7 +144,7 @@ TEST(ToolEmitC, WritesTheCOfTheOptimisedProgram) {
             std::string::npos)
       << result.out;
   Result checked = ssaopt("--emit=c --keep-checks " + example("typical_run"));
-  EXPECT_NE(checked.out.find("  command = ssa_to_int16(ssa_input_speed());\n"), std::string::npos)
+  EXPECT_NE(checked.out.find("  command = ssa_to_int16(ssa_int(ssa_input_speed()));\n"), std::string::npos)
       << checked.out;
   EXPECT_EQ(result.out.find("limitCommand"), std::string::npos) << "inlined, so gone";
 }
