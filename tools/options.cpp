@@ -195,7 +195,7 @@ std::string usageText() {
   text << "usage: ssaopt [options] FILE\n"
           "       ssaopt run FILE [--passes=LIST] [--steps N] [--seed S] [--inputs VALUES]\n"
           "       ssaopt check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S]\n"
-          "       ssaopt cc-check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S]\n"
+          "       ssaopt cc-check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S] [--keep-checks]\n"
           "       ssaopt generate [--seed S] [--size N]\n"
           "       ssaopt fuzz [--programs P] [--seed S] [--size N] [--passes=LIST]\n"
           "\n"

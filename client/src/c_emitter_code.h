@@ -59,6 +59,12 @@ std::string rangeMark(const std::string& value, const ValueRange& range);
 // range shows it to be defined.
 std::pair<std::string, std::string> integerViewAround(const std::optional<ValueRange>& range);
 
+// What a term knows of an operand that stands for an integer: the integer literal it is, or its range.
+struct IntegerOperand {
+  std::optional<double> literal;  // where the operand is a whole literal within 32 bits
+  std::optional<ValueRange> range;
+};
+
 // How a variable is held in C.
 struct CVariable {
   const KvCCfgSFVariable* pVariable = nullptr;
@@ -147,8 +153,9 @@ private:
   static KvCCfgVariable* onlyVariableOf(KvCCfgExpression* pExpression);
   Code expression(KvCCfgExpression* pExpression, bool condition);
   Code libraryExpression(KvCCfgExpression* pExpression);
-  InfixText::Term elementReadTerm(CVariable& array, const std::optional<ValueRange>& index);
-  InfixText::Term elementWriteTerm(CVariable& array, const std::optional<ValueRange>& index,
+  std::optional<std::pair<std::string, std::string>> directElement(CVariable& array, const IntegerOperand& index);
+  InfixText::Term elementReadTerm(CVariable& array, const IntegerOperand& index);
+  InfixText::Term elementWriteTerm(CVariable& array, const IntegerOperand& index,
                                    const std::optional<ValueRange>& value);
   Code terms(const KvCCfgSFExpression& expression, bool condition);
   std::vector<std::string> assignment(KvCCfgAssignment& assignment);

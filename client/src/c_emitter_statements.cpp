@@ -68,13 +68,31 @@ InfixText::Term operatorTerm(TermOp op, const InfixText::Operand* operands, bool
   return InfixText::Term{std::string(helperOf(op)) + "(", arityOf(op) == 2 ? ", " : "", ")", kAtomPrecedence};
 }
 
+// The text around an integer operand that gives its integer view, or in its place the literal it is.
+std::pair<std::string, std::string> integerView(const IntegerOperand& operand) {
+  if (operand.literal) return {formatNumber(*operand.literal), ""};
+  return integerViewAround(operand.range);
+}
+
 // An integer operator's helper takes the integer views of its operands.
-InfixText::Term integerOperatorTerm(TermOp op, const std::optional<ValueRange>* operandRanges) {
-  std::pair<std::string, std::string> first = integerViewAround(operandRanges[0]);
+InfixText::Term integerOperatorTerm(TermOp op, const IntegerOperand* operands) {
+  std::pair<std::string, std::string> first = integerView(operands[0]);
   std::string before = std::string(helperOf(op)) + "(" + first.first;
-  if (arityOf(op) == 1) return InfixText::Term{before, "", first.second + ")", kAtomPrecedence};
-  std::pair<std::string, std::string> second = integerViewAround(operandRanges[1]);
-  return InfixText::Term{before, first.second + ", " + second.first, second.second + ")", kAtomPrecedence};
+  bool hidden[2] = {operands[0].literal.has_value(), false};
+  if (arityOf(op) == 1) return InfixText::Term{before, "", first.second + ")", kAtomPrecedence, {}, {hidden[0]}};
+  std::pair<std::string, std::string> second = integerView(operands[1]);
+  hidden[1] = operands[1].literal.has_value();
+  return InfixText::Term{before,           first.second + ", " + second.first, second.second + ")",
+                         kAtomPrecedence, {},
+                         {hidden[0], hidden[1]}};
+}
+
+// A literal whose integer view is itself, which C reads as an int.
+std::optional<double> integerLiteral(const KvCCfgSFExpression::Term& term) {
+  if (term.op != TermOp::Literal || term.number != std::trunc(term.number) || term.number <= INT32_MIN ||
+      term.number > INT32_MAX)
+    return std::nullopt;
+  return term.number;
 }
 
 // Reading a variable of a float type or a scaled one may give NaN: nothing in storing converts it.
@@ -207,6 +225,9 @@ CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool 
     if (term.op == TermOp::Literal) {
       result = literalTerm(term.number);
     } else if (namesVariable(term.op)) {
+      auto integerOperand = [&](std::size_t k) {
+        return IntegerOperand{integerLiteral(terms[operandEnds[k]]), rangeAt(operandEnds[k])};
+      };
       CVariable& variable = m_Variables.of(term.pVariable);
       if (variable.pVariable->isArray() != (term.op != TermOp::Variable))
         throw Unemittable{"uses " + nameOf(term.pVariable) +
@@ -229,14 +250,15 @@ CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool 
         std::string read = m_Variables.readText(variable);
         result = InfixText::Term{read, "", "", read[0] == '(' ? kUnaryPrecedence : kAtomPrecedence};
       } else if (term.op == TermOp::ElementRead) {
-        result = elementReadTerm(variable, rangeAt(operandEnds[0]));
+        result = elementReadTerm(variable, integerOperand(0));
       } else {
-        result = elementWriteTerm(variable, rangeAt(operandEnds[0]), rangeAt(operandEnds[1]));
+        result = elementWriteTerm(variable, integerOperand(0), rangeAt(operandEnds[1]));
       }
     } else if (isIntegerOperator(term.op)) {
-      std::optional<ValueRange> operandRanges[2] = {rangeAt(operandEnds[0]),
-                                                    arity > 1 ? rangeAt(operandEnds[1]) : std::nullopt};
-      result = integerOperatorTerm(term.op, operandRanges);
+      IntegerOperand operands[2];
+      for (std::size_t k = 0; k < 2; ++k)
+        if (k < arity) operands[k] = IntegerOperand{integerLiteral(terms[operandEnds[k]]), rangeAt(operandEnds[k])};
+      result = integerOperatorTerm(term.op, operands);
     } else {
       result = operatorTerm(term.op, text.operands(arity),
                             condition && i + 1 == terms.size() && isComparison(term.op));
@@ -252,31 +274,43 @@ CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool 
   return code;
 }
 
-// An element read through the helper that checks its index, or directly where the index's range lies
-// within the array.
-InfixText::Term CStatements::elementReadTerm(CVariable& array, const std::optional<ValueRange>& index) {
+// The text around the index that names the element directly, where the index lies within the array
+// (as a literal, or as its range shows); nothing where it may not.
+std::optional<std::pair<std::string, std::string>> CStatements::directElement(CVariable& array,
+                                                                             const IntegerOperand& index) {
   array.stored = true;
-  if (!index || !CVariables::withinArray(array, *index)) {
-    std::pair<std::string, std::string> view = integerViewAround(index);
-    return InfixText::Term{"ssa_read_" + array.name + "(" + view.first, "", view.second + ")", kAtomPrecedence};
-  }
-  std::pair<std::string, std::string> element = m_Variables.elementAround(array, *index);
-  if (array.heldAsDouble) return InfixText::Term{element.first, "", element.second, kAtomPrecedence};
-  return InfixText::Term{"(double)" + element.first, "", element.second, kUnaryPrecedence};
+  double length = static_cast<double>(array.pVariable->getArrayLength());
+  if (index.literal && *index.literal >= 0.0 && *index.literal < length)
+    return std::make_pair(array.name + "[" + formatNumber(*index.literal), std::string("]"));
+  if (!index.literal && index.range && CVariables::withinArray(array, *index.range))
+    return m_Variables.elementAround(array, *index.range);
+  return std::nullopt;
 }
 
-// An element write through the helper that checks its index and stores, or as an assignment where the
-// index's range lies within the array.
-InfixText::Term CStatements::elementWriteTerm(CVariable& array, const std::optional<ValueRange>& index,
-                                              const std::optional<ValueRange>& value) {
-  array.stored = true;
-  if (!index || !CVariables::withinArray(array, *index)) {
-    std::pair<std::string, std::string> view = integerViewAround(index);
-    return InfixText::Term{"ssa_write_" + array.name + "(" + view.first, view.second + ", ", ")", 0};
+// An element read directly, or through the helper that checks its index.
+InfixText::Term CStatements::elementReadTerm(CVariable& array, const IntegerOperand& index) {
+  bool hidden = index.literal.has_value();
+  std::optional<std::pair<std::string, std::string>> element = directElement(array, index);
+  if (!element) {
+    std::pair<std::string, std::string> view = integerView(index);
+    return InfixText::Term{"ssa_read_" + array.name + "(" + view.first, "", view.second + ")", kAtomPrecedence,
+                           {}, {hidden}};
   }
-  std::pair<std::string, std::string> element = m_Variables.elementAround(array, *index);
+  if (array.heldAsDouble) return InfixText::Term{element->first, "", element->second, kAtomPrecedence, {}, {hidden}};
+  return InfixText::Term{"(double)" + element->first, "", element->second, kUnaryPrecedence, {}, {hidden}};
+}
+
+// An element write as an assignment, or through the helper that checks its index and stores.
+InfixText::Term CStatements::elementWriteTerm(CVariable& array, const IntegerOperand& index,
+                                              const std::optional<ValueRange>& value) {
+  bool hidden = index.literal.has_value();
+  std::optional<std::pair<std::string, std::string>> element = directElement(array, index);
+  if (!element) {
+    std::pair<std::string, std::string> view = integerView(index);
+    return InfixText::Term{"ssa_write_" + array.name + "(" + view.first, view.second + ", ", ")", 0, {}, {hidden}};
+  }
   std::pair<std::string, std::string> store = m_Variables.storeAround(array, value);
-  return InfixText::Term{element.first, element.second + " = " + store.first, store.second, 0};
+  return InfixText::Term{element->first, element->second + " = " + store.first, store.second, 0, {}, {hidden}};
 }
 
 std::vector<std::string> CStatements::statement(KvCCfgStatement& statement, const KvCControlFlowGraph& graph,
