@@ -234,4 +234,13 @@ TEST_F(EmittingC, ChecksThatRangesShowToBeNeedlessAreLeftOut) {
   EXPECT_FALSE(contains(emit(program, {"ssa", "divide", "sccp"}, false).text, "SSA_RANGE"));
 }
 
+TEST_F(EmittingC, LongExpressionsAreWrittenWhole) {
+  std::string sum = "b";
+  for (int i = 1; i < 100000; ++i) sum += " + b";
+  std::string text = emit("var int32 a output = 0;\nvar int32 b = 1;\nproc #main {\n  a = " + sum + ";\n}\n").text;
+  std::string expected = "(double)b";
+  for (int i = 1; i < 100000; ++i) expected += " + (double)b";
+  EXPECT_NE(text.find("  a = ssa_to_int32(ssa_int(" + expected + "));\n"), std::string::npos);
+}
+
 }  // namespace

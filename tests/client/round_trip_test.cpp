@@ -60,6 +60,18 @@ TEST_F(RoundTrip, ExpressionsKeepOnlyTheParenthesesTheyNeed) {
             "}\n");
 }
 
+TEST_F(RoundTrip, LongAndDeeplyNestedExpressionsReadBackWhole) {
+  // Each term's text is written once: no copying of operands into their parents, which costs the
+  // square of the length, and no recursion as deep as the nesting.
+  std::string sum = "b";
+  for (int i = 1; i < 100000; ++i) sum += " + b";
+  std::string nested = "b - b";
+  for (int i = 1; i < 900; ++i) nested = "b - (" + nested + ")";
+  std::string printed = printTwice("var int32 a;\nvar int32 b;\n\nproc #main {\n  a = " + sum + ";\n  a = " +
+                                   nested + ";\n}\n");
+  EXPECT_NE(printed.find("  a = " + sum + ";\n  a = " + nested + ";\n"), std::string::npos);
+}
+
 // Procedures follow the text, empty ones stay empty, and blocks split at calls read back as written.
 TEST_F(RoundTrip, ProceduresAndCallsReadBackAsWritten) {
   EXPECT_EQ(printTwice("var int16 x; var int16 p;\n"
