@@ -39,9 +39,9 @@ TEST(ToolCcCheck, EveryExampleCompilesWithEachCompilerAndBehavesAsInterpreted) {
     if (!hasCommand(compiler)) continue;
     ++compilers;
     for (const char* name : kExamples) {
-      Result result = ccCheckWith(compiler, example(name) + " --runs 5");
+      Result result = ccCheckWith(compiler, example(name) + " --runs 3");
       EXPECT_EQ(result.status, 0) << compiler << " " << name << "\n" << result.out << result.err;
-      EXPECT_EQ(result.out, "same behaviour on 5 runs (interpreter and compiled C)\n") << compiler << " " << name;
+      EXPECT_EQ(result.out, "same behaviour on 3 runs (interpreter and compiled C)\n") << compiler << " " << name;
     }
   }
   if (compilers == 0) GTEST_SKIP() << "neither gcc nor clang is installed";
