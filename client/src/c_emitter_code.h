@@ -158,6 +158,9 @@ private:
   InfixText::Term elementWriteTerm(CVariable& array, const IntegerOperand& index,
                                    const std::optional<ValueRange>& value);
   Code terms(const KvCCfgSFExpression& expression, bool condition);
+  struct Terms;
+  InfixText::Term termText(Terms& terms, std::size_t i, bool& readsTemporary);
+  InfixText::Term variableTerm(Terms& terms, std::size_t i, bool& readsTemporary);
   std::vector<std::string> assignment(KvCCfgAssignment& assignment);
   std::vector<std::string> call(KvCCfgProcedureCall& call, const KvCControlFlowGraph& graph,
                                 bool argumentsAtCalls);

@@ -198,80 +198,103 @@ CStatements::Code CStatements::libraryExpression(KvCCfgExpression* pExpression) 
   return Code{{}, literalTerm(value.getValue()).before, std::nullopt};
 }
 
+// One expression as it is written term by term: for each term the range and whether it may be NaN of
+// the sub-expression it ends, and for each piece on the stack the term that ends it and whether it
+// reads an input that was read first into a temporary.
+struct CStatements::Terms {
+  const KvCCfgSFExpression::Terms& terms;
+  const CStatements& statements;
+  bool condition;
+  bool readsFirst;  // the expression reads inputs more than once: each goes into a temporary first
+  std::vector<KvCCfgSFExpression::Bounds> bounds = {};
+  std::vector<bool> mayBeNaN = {};
+  std::vector<std::size_t> ends = {};
+  std::vector<bool> readsTemporary = {};
+  InfixText text = {};
+  Code code = {};
+
+  std::optional<ValueRange> rangeAt(std::size_t term) const {
+    return term < bounds.size() ? statements.rangeOf(bounds[term].first, bounds[term].second, mayBeNaN[term])
+                                : std::nullopt;
+  }
+  // The term that ends operand `k` of the term about to be written, which has `arity` operands.
+  std::size_t operandEnd(std::size_t arity, std::size_t k) const { return ends[ends.size() - arity + k]; }
+  IntegerOperand integerOperand(std::size_t arity, std::size_t k) const {
+    std::size_t end = operandEnd(arity, k);
+    return IntegerOperand{integerLiteral(terms[end]), rangeAt(end)};
+  }
+  bool operandsReadTemporary(std::size_t arity) const {
+    return std::any_of(readsTemporary.end() - static_cast<std::ptrdiff_t>(arity), readsTemporary.end(),
+                       [](bool reads) { return reads; });
+  }
+};
+
 CStatements::Code CStatements::terms(const KvCCfgSFExpression& expression, bool condition) {
   const KvCCfgSFExpression::Terms& terms = expression.getTerms();
   if (terms.empty()) throw Unemittable{"an expression without terms"};
-  bool readsFirst = std::count_if(terms.begin(), terms.end(), readsInput) > 1;
-  std::vector<KvCCfgSFExpression::Bounds> bounds;
-  if (m_UseRanges && !expression.isMarkedAsEvalToNonConst()) bounds = expression.getTermBounds(true);
-  std::vector<bool> mayBeNaN;  // of each term: whether the sub-expression it ends may be NaN
-  // The range of the sub-expression that term `i` ends.
-  auto rangeAt = [&](std::size_t i) {
-    return i < bounds.size() ? rangeOf(bounds[i].first, bounds[i].second, mayBeNaN[i]) : std::nullopt;
-  };
-  std::vector<std::size_t> ends;  // of each piece: the term that ends it
-  Code code;
-  InfixText text;
-  std::vector<bool> readsTemporary;  // of each piece: an input read first into a temporary
+  Terms progress{terms, *this, condition, std::count_if(terms.begin(), terms.end(), readsInput) > 1};
+  if (m_UseRanges && !expression.isMarkedAsEvalToNonConst()) progress.bounds = expression.getTermBounds(true);
   for (std::size_t i = 0; i < terms.size(); ++i) {
-    const KvCCfgSFExpression::Term& term = terms[i];
-    std::size_t arity = static_cast<std::size_t>(arityOf(term.op));
-    bool operandsReadTemporary = std::any_of(readsTemporary.end() - static_cast<std::ptrdiff_t>(arity),
-                                             readsTemporary.end(), [](bool reads) { return reads; });
-    const std::size_t* operandEnds = ends.data() + (ends.size() - arity);
-    mayBeNaN.push_back(givesNaN(term, operandEnds, mayBeNaN, [&](std::size_t end) { return rangeAt(end); }));
-    InfixText::Term result;
-    bool resultReadsTemporary = operandsReadTemporary && !readsInput(term);
-    if (term.op == TermOp::Literal) {
-      result = literalTerm(term.number);
-    } else if (namesVariable(term.op)) {
-      auto integerOperand = [&](std::size_t k) {
-        return IntegerOperand{integerLiteral(terms[operandEnds[k]]), rangeAt(operandEnds[k])};
-      };
-      CVariable& variable = m_Variables.of(term.pVariable);
-      if (variable.pVariable->isArray() != (term.op != TermOp::Variable))
-        throw Unemittable{"uses " + nameOf(term.pVariable) +
-                          (variable.pVariable->isArray() ? " without" : " with") + " an index"};
-      if (readsInput(term)) {
-        std::string input = m_Variables.inputText(variable);
-        if (readsFirst) {
-          std::string name = temporary("in");
-          code.prelude.push_back("double " + name + " = " + input + ";");
-          input = name;
-          resultReadsTemporary = true;
-        }
-        // An element of an input array reads the stream whatever its index, which is only computed
-        // where it reads temporaries, so that each is used.
-        if (term.op == TermOp::ElementRead && operandsReadTemporary)
-          result = InfixText::Term{"((void)(", "", "), " + input + ")", kAtomPrecedence};
-        else
-          result = InfixText::Term{input, "", "", kAtomPrecedence, {false}, {term.op == TermOp::ElementRead}};
-      } else if (term.op == TermOp::Variable) {
-        std::string read = m_Variables.readText(variable);
-        result = InfixText::Term{read, "", "", read[0] == '(' ? kUnaryPrecedence : kAtomPrecedence};
-      } else if (term.op == TermOp::ElementRead) {
-        result = elementReadTerm(variable, integerOperand(0));
-      } else {
-        result = elementWriteTerm(variable, integerOperand(0), rangeAt(operandEnds[1]));
-      }
-    } else if (isIntegerOperator(term.op)) {
-      IntegerOperand operands[2];
-      for (std::size_t k = 0; k < 2; ++k)
-        if (k < arity) operands[k] = IntegerOperand{integerLiteral(terms[operandEnds[k]]), rangeAt(operandEnds[k])};
-      result = integerOperatorTerm(term.op, operands);
-    } else {
-      result = operatorTerm(term.op, text.operands(arity),
-                            condition && i + 1 == terms.size() && isComparison(term.op));
-    }
-    text.push(arity, result);
-    readsTemporary.resize(readsTemporary.size() - arity);
-    readsTemporary.push_back(resultReadsTemporary);
-    ends.resize(ends.size() - arity);
-    ends.push_back(i);
+    std::size_t arity = static_cast<std::size_t>(arityOf(terms[i].op));
+    const std::size_t* operandEnds = progress.ends.data() + (progress.ends.size() - arity);
+    progress.mayBeNaN.push_back(givesNaN(terms[i], operandEnds, progress.mayBeNaN,
+                                         [&](std::size_t end) { return progress.rangeAt(end); }));
+    bool readsTemporary = progress.operandsReadTemporary(arity) && !readsInput(terms[i]);
+    InfixText::Term text = termText(progress, i, readsTemporary);
+    progress.text.push(arity, text);
+    progress.readsTemporary.resize(progress.readsTemporary.size() - arity);
+    progress.readsTemporary.push_back(readsTemporary);
+    progress.ends.resize(progress.ends.size() - arity);
+    progress.ends.push_back(i);
   }
-  code.text = text.text(text.pieces() - 1);
-  code.range = rangeAt(terms.size() - 1);
-  return code;
+  progress.code.text = progress.text.text(progress.text.pieces() - 1);
+  progress.code.range = progress.rangeAt(terms.size() - 1);
+  return progress.code;
+}
+
+InfixText::Term CStatements::termText(Terms& progress, std::size_t i, bool& readsTemporary) {
+  const KvCCfgSFExpression::Term& term = progress.terms[i];
+  std::size_t arity = static_cast<std::size_t>(arityOf(term.op));
+  if (term.op == TermOp::Literal) return literalTerm(term.number);
+  if (namesVariable(term.op)) return variableTerm(progress, i, readsTemporary);
+  if (isIntegerOperator(term.op)) {
+    IntegerOperand operands[2] = {progress.integerOperand(arity, 0),
+                                  arity > 1 ? progress.integerOperand(arity, 1) : IntegerOperand{}};
+    return integerOperatorTerm(term.op, operands);
+  }
+  bool topComparison = progress.condition && i + 1 == progress.terms.size() && isComparison(term.op);
+  return operatorTerm(term.op, progress.text.operands(arity), topComparison);
+}
+
+// A variable read, an input read (into a temporary where the expression reads several), or an element
+// read or write.
+InfixText::Term CStatements::variableTerm(Terms& progress, std::size_t i, bool& readsTemporary) {
+  const KvCCfgSFExpression::Term& term = progress.terms[i];
+  std::size_t arity = static_cast<std::size_t>(arityOf(term.op));
+  CVariable& variable = m_Variables.of(term.pVariable);
+  if (variable.pVariable->isArray() != (term.op != TermOp::Variable))
+    throw Unemittable{"uses " + nameOf(term.pVariable) + (variable.pVariable->isArray() ? " without" : " with") +
+                      " an index"};
+  if (readsInput(term)) {
+    std::string input = m_Variables.inputText(variable);
+    if (progress.readsFirst) {
+      std::string name = temporary("in");
+      progress.code.prelude.push_back("double " + name + " = " + input + ";");
+      input = name;
+      readsTemporary = true;
+    }
+    // An element of an input array reads the stream whatever its index, which is only computed where
+    // it reads temporaries, so that each is used.
+    if (term.op == TermOp::ElementRead && progress.operandsReadTemporary(arity))
+      return InfixText::Term{"((void)(", "", "), " + input + ")", kAtomPrecedence};
+    return InfixText::Term{input, "", "", kAtomPrecedence, {false}, {term.op == TermOp::ElementRead}};
+  }
+  if (term.op == TermOp::Variable) {
+    std::string read = m_Variables.readText(variable);
+    return InfixText::Term{read, "", "", read[0] == '(' ? kUnaryPrecedence : kAtomPrecedence};
+  }
+  if (term.op == TermOp::ElementRead) return elementReadTerm(variable, progress.integerOperand(arity, 0));
+  return elementWriteTerm(variable, progress.integerOperand(arity, 0), progress.rangeAt(progress.operandEnd(arity, 1)));
 }
 
 // The text around the index that names the element directly, where the index lies within the array
