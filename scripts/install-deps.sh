@@ -2,7 +2,8 @@
 # Installs the Debian packages the project needs to build and test, when any is missing.
 set -euo pipefail
 
-packages=(g++ cmake ninja-build libgtest-dev libgmock-dev libbenchmark-dev graphviz clang libclang-rt-14-dev)
+packages=(g++ cmake ninja-build libgtest-dev libgmock-dev libbenchmark-dev graphviz clang libclang-rt-14-dev
+          valgrind doxygen)
 
 missing=()
 for package in "${packages[@]}"; do

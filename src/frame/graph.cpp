@@ -25,6 +25,7 @@ void graph::copyShapeFrom(const graph& other) {
 
 node graph::new_node() {
   NodeRep* v = new NodeRep;
+  m_PoolHold.holdLatest();
   v->index = m_NextNodeIndex++;
   v->prev = m_pLastNode;
   (m_pLastNode ? m_pLastNode->next : m_pFirstNode) = v;
@@ -35,6 +36,7 @@ node graph::new_node() {
 
 edge graph::new_edge(node v, node w) {
   EdgeRep* e = new EdgeRep;
+  m_PoolHold.holdLatest();
   e->index = m_NextEdgeIndex++;
   e->prev = m_pLastEdge;
   (m_pLastEdge ? m_pLastEdge->next : m_pFirstEdge) = e;

@@ -1,7 +1,12 @@
-# Installs the freshly built library into a scratch prefix, then configures, builds and runs a tiny
-# consumer project that finds it with find_package(ssaopt CONFIG REQUIRED).
-file(REMOVE_RECURSE ${WORK_DIR})
+# The install tree must serve a project outside this one.
+#
+# MODE "build": installs the freshly built library and client into a scratch prefix, then configures,
+# builds and runs a consumer project that finds them with find_package(ssaopt CONFIG REQUIRED).
+# MODE "valgrind": runs the consumer that MODE "build" made under valgrind, with the module's own pool
+# and with a pool controller of its own; any leak or memory error fails.
+cmake_policy(VERSION 3.20)
 set(prefix ${WORK_DIR}/prefix)
+set(consumer_dir ${WORK_DIR}/build)
 
 function(run)
   execute_process(COMMAND ${ARGV} RESULT_VARIABLE rc OUTPUT_VARIABLE out ERROR_VARIABLE err)
@@ -10,8 +15,25 @@ function(run)
   endif()
 endfunction()
 
-run(${CMAKE_COMMAND} --install ${BINARY_DIR} --prefix ${prefix})
-run(${CMAKE_COMMAND} -S ${SOURCE_DIR}/tests/install/consumer -B ${WORK_DIR}/build -G ${GENERATOR}
-    -DCMAKE_PREFIX_PATH=${prefix})
-run(${CMAKE_COMMAND} --build ${WORK_DIR}/build)
-run(${WORK_DIR}/build/consumer)
+if(MODE STREQUAL "build")
+  file(REMOVE_RECURSE ${WORK_DIR})
+  run(${CMAKE_COMMAND} --install ${BINARY_DIR} --prefix ${prefix})
+  run(${CMAKE_COMMAND} -S ${SOURCE_DIR}/tests/install/consumer -B ${consumer_dir} -G ${GENERATOR}
+      -DCMAKE_PREFIX_PATH=${prefix} -DCMAKE_BUILD_TYPE=${BUILD_TYPE})
+  run(${CMAKE_COMMAND} --build ${consumer_dir})
+  run(${consumer_dir}/consumer)
+  run(${consumer_dir}/client_consumer)
+  run(${consumer_dir}/client_consumer own-controller)
+elseif(MODE STREQUAL "valgrind")
+  find_program(VALGRIND valgrind)
+  if(NOT VALGRIND)
+    message("valgrind is not installed: skipping the memory check of the consumer")
+    return()
+  endif()
+  set(memcheck ${VALGRIND} --quiet --error-exitcode=99 --leak-check=full --show-leak-kinds=all
+      --errors-for-leak-kinds=all)
+  run(${memcheck} ${consumer_dir}/client_consumer)
+  run(${memcheck} ${consumer_dir}/client_consumer own-controller)
+else()
+  message(FATAL_ERROR "unknown MODE '${MODE}'")
+endif()

@@ -24,15 +24,24 @@ public:
 // The library's module control object. The host constructs it and calls boot() before using the
 // library, shutdown() at the end. Neither resets the per-class object counters: the classes' static
 // boot() operations do that.
+//
+// Memory: when no host controller is installed (pKVMemory null) at boot(), the module opens a session
+// with a pool of its own, from which every library object made until shutdown() takes its memory.
+// shutdown() releases that pool with everything in it, so the objects that the library made and that
+// no one deletes (payloads, procedures, SSA versions, ...) leak nothing. Graphs and the objects a
+// client made with the library's classes are deleted before shutdown(); a graph that is not is
+// reported and keeps its memory until it goes. With a host controller installed, boot() and
+// shutdown() leave memory to it. Destroying a booted control shuts it down; a copy is not booted.
 class KvCSSAControl : public KvCControl {
 public:
   KvCSSAControl() = default;
   KvCSSAControl(const KvCSSAControl& other) = default;
   KvCSSAControl& operator=(const KvCSSAControl& other) = default;
-  ~KvCSSAControl() override = default;
+  ~KvCSSAControl() override;
 
-  bool boot() { return true; }
-  bool shutdown() { return true; }
+  // Both always return true; calling either again does nothing more.
+  bool boot();
+  bool shutdown();
 };
 
 namespace ssaopt {

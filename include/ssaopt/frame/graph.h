@@ -258,6 +258,9 @@ private:
   int m_EdgeCount = 0;
   std::uint32_t m_NextNodeIndex = 0;
   std::uint32_t m_NextEdgeIndex = 0;
+  // Keeps the pools that served the nodes and edges from releasing their memory while the graph
+  // lives; a copy holds what served its own nodes and edges.
+  PoolHold m_PoolHold;
 };
 
 // A value for every node (or edge) of a graph, indexed by creation number. Entries for nodes created

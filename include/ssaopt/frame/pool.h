@@ -1,11 +1,15 @@
 // A pooling memory controller for hosts to install as pKVMemory. Small blocks come from size-class
 // free lists carved out of large chunks; large blocks come from the heap one by one. It keeps account
 // of blocks and bytes in use and of the peak, and releases everything it ever handed out when it is
-// destroyed, so a whole run leaks nothing even though the graph by design deletes no payload.
+// destroyed, so a run leaks nothing even though the graph by design deletes no payload. The module's
+// own pools (see memory.h) work the same way.
+//
+// A block goes back to the pool that handed it out, whichever pool (or none) is installed when it is
+// freed. A pool destroyed while a graph still holds blocks of it is reported and keeps its memory
+// until the last such graph is gone; other library objects go before their pool ends.
 #pragma once
 
 #include <cstddef>
-#include <cstdint>
 
 #include "ssaopt/frame/memory.h"
 
@@ -22,15 +26,15 @@ public:
   void freeMemBlock(void* block) override;
 
   // Blocks handed out and not yet freed, with the bytes requested for them.
-  std::size_t blocksInUse() const { return m_BlocksInUse; }
-  std::size_t bytesInUse() const { return m_BytesInUse; }
+  std::size_t blocksInUse() const;
+  std::size_t bytesInUse() const;
   // The largest bytesInUse() seen so far.
-  std::size_t peakBytes() const { return m_PeakBytes; }
+  std::size_t peakBytes() const;
   // Bytes obtained from the heap for chunks and large blocks.
-  std::size_t bytesReserved() const { return m_BytesReserved; }
+  std::size_t bytesReserved() const;
 
   // Installs a controller as pKVMemory for the lifetime of this object and restores the previous
-  // one afterwards; the controller must outlive every library object made meanwhile.
+  // one afterwards.
   class Scope {
   public:
     explicit Scope(KvCMemController* controller) : m_pPrevious(pKVMemory) { pKVMemory = controller; }
@@ -43,27 +47,11 @@ public:
   };
 
 private:
-  struct Header;
-  struct FreeBlock {
-    FreeBlock* next;
-  };
-  struct LargeBlock;
-
-  static constexpr std::size_t kGranule = 16;     // size classes are multiples of this
-  static constexpr std::size_t kClasses = 32;     // so blocks up to 512 bytes are pooled
-  static constexpr std::size_t kChunkBytes = 1 << 16;
-
-  void* allocSmall(std::size_t sizeClass);
-  void* allocLarge(std::size_t size);
-  void refill(std::size_t sizeClass);
-
-  FreeBlock* m_FreeLists[kClasses] = {};
-  void* m_pChunks = nullptr;          // chunks, linked through their first word
-  LargeBlock* m_pLargeBlocks = nullptr;  // doubly linked, so freeing one is O(1)
-  std::size_t m_BlocksInUse = 0;
-  std::size_t m_BytesInUse = 0;
-  std::size_t m_PeakBytes = 0;
-  std::size_t m_BytesReserved = 0;
+  detail::PoolArena* m_pArena;
 };
+
+// Bytes that all pools hold from the heap: the module's own and those of every PoolMemController,
+// including pools kept for graphs that outlived them.
+std::size_t poolBytesReserved();
 
 }  // namespace ssaopt

@@ -19,8 +19,7 @@
 // variable is both volatile and erasable, and every variable an external call may modify is volatile
 // or an array (the library treats external calls as defining nothing).
 //
-// The program is made while a memory controller is installed, and must be destroyed while the same
-// one still is (see program.h).
+// The program is destroyed before the memory pool it was made in ends (see program.h).
 #pragma once
 
 #include <memory>

@@ -4,8 +4,9 @@
 //
 // Ownership: the graph deletes no payload, statement or expression by design. The program deletes the
 // variables and expressions that the client made; what the library made (blocks, edges, SSA versions,
-// interface statements, procedure records) is left to the memory controller, so a program is made and
-// destroyed while one pool controller is installed (the tool does so for its whole run).
+// interface statements, procedure records) is left to the memory pool it came from (the module's own
+// between KvCSSAControl::boot() and shutdown(), or a PoolMemController), so a program is destroyed
+// before that pool ends.
 #pragma once
 
 #include <cstdint>
