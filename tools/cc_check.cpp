@@ -5,8 +5,8 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <chrono>
 #include <cctype>
+#include <chrono>
 #include <cmath>
 #include <csignal>
 #include <cstdio>

@@ -351,6 +351,8 @@ private:
 
 }  // namespace
 
-EmittedC emitC(const Program& program, const EmitOptions& options) { return CEmitter(program, options).emit(); }
+EmittedC emitC(const Program& program, const EmitOptions& options) {
+  return CEmitter(program, options).emit();
+}
 
 }  // namespace ssaopt::client

@@ -95,7 +95,8 @@ public:
   std::string storeText(CVariable& variable, const std::string& value,
                         const std::optional<ValueRange>& range = std::nullopt);
   // The same as the text before and after the value.
-  std::pair<std::string, std::string> storeAround(CVariable& variable, const std::optional<ValueRange>& range);
+  std::pair<std::string, std::string> storeAround(CVariable& variable,
+                                                  const std::optional<ValueRange>& range);
   // The C text before and after an index that names the element directly, for an index whose range
   // lies within the array: without the helper that checks the index.
   std::pair<std::string, std::string> elementAround(CVariable& variable, const ValueRange& index);
@@ -153,7 +154,8 @@ private:
   static KvCCfgVariable* onlyVariableOf(KvCCfgExpression* pExpression);
   Code expression(KvCCfgExpression* pExpression, bool condition);
   Code libraryExpression(KvCCfgExpression* pExpression);
-  std::optional<std::pair<std::string, std::string>> directElement(CVariable& array, const IntegerOperand& index);
+  std::optional<std::pair<std::string, std::string>> directElement(CVariable& array,
+                                                                   const IntegerOperand& index);
   InfixText::Term elementReadTerm(CVariable& array, const IntegerOperand& index);
   InfixText::Term elementWriteTerm(CVariable& array, const IntegerOperand& index,
                                    const std::optional<ValueRange>& value);

@@ -58,11 +58,17 @@ InfixText::Term literalTerm(double number) {
 
 InfixText::Term operatorTerm(TermOp op, const InfixText::Operand* operands, bool topComparison) {
   if (op == TermOp::Negate)
-    return InfixText::Term{
-        "-", "", "", kUnaryPrecedence, {operands[0].precedence < kUnaryPrecedence || operands[0].first == '-'}};
+    return InfixText::Term{"-",
+                           "",
+                           "",
+                           kUnaryPrecedence,
+                           {operands[0].precedence < kUnaryPrecedence || operands[0].first == '-'}};
   if (op == TermOp::Add || op == TermOp::Subtract || topComparison) {
     int precedence = topComparison ? kInfixComparison : kInfixAdditive;
-    return InfixText::Term{"", std::string(" ") + spellingOf(op) + " ", "", precedence,
+    return InfixText::Term{"",
+                           std::string(" ") + spellingOf(op) + " ",
+                           "",
+                           precedence,
                            {operands[0].precedence < precedence, operands[1].precedence <= precedence}};
   }
   return InfixText::Term{std::string(helperOf(op)) + "(", arityOf(op) == 2 ? ", " : "", ")", kAtomPrecedence};
@@ -79,11 +85,15 @@ InfixText::Term integerOperatorTerm(TermOp op, const IntegerOperand* operands) {
   std::pair<std::string, std::string> first = integerView(operands[0]);
   std::string before = std::string(helperOf(op)) + "(" + first.first;
   bool hidden[2] = {operands[0].literal.has_value(), false};
-  if (arityOf(op) == 1) return InfixText::Term{before, "", first.second + ")", kAtomPrecedence, {}, {hidden[0]}};
+  if (arityOf(op) == 1)
+    return InfixText::Term{before, "", first.second + ")", kAtomPrecedence, {}, {hidden[0]}};
   std::pair<std::string, std::string> second = integerView(operands[1]);
   hidden[1] = operands[1].literal.has_value();
-  return InfixText::Term{before,           first.second + ", " + second.first, second.second + ")",
-                         kAtomPrecedence, {},
+  return InfixText::Term{before,
+                         first.second + ", " + second.first,
+                         second.second + ")",
+                         kAtomPrecedence,
+                         {},
                          {hidden[0], hidden[1]}};
 }
 
@@ -116,8 +126,8 @@ bool givesNaN(const KvCCfgSFExpression::Term& term, const std::size_t* operandEn
   bool makesNaN = term.op == TermOp::Add || term.op == TermOp::Subtract || term.op == TermOp::Divide;
   for (std::size_t i = 0; i < arity; ++i) {
     std::optional<ValueRange> operand = rangeAt(operandEnds[i]);
-    if (mayBeNaN[operandEnds[i]] || (makesNaN && (!operand || !std::isfinite(operand->lo) ||
-                                                  !std::isfinite(operand->hi))))
+    if (mayBeNaN[operandEnds[i]] ||
+        (makesNaN && (!operand || !std::isfinite(operand->lo) || !std::isfinite(operand->hi))))
       return true;
   }
   return false;
@@ -164,7 +174,7 @@ std::string CStatements::temporary(const std::string& kind) {
 }
 
 std::optional<ValueRange> CStatements::rangeOf(const KvCCfgValue& lo, const KvCCfgValue& hi,
-                                                bool mayBeNaN) const {
+                                               bool mayBeNaN) const {
   if (!m_UseRanges || !lo.isConstant() || !hi.isConstant() || !(lo.getValue() <= hi.getValue()))
     return std::nullopt;
   return ValueRange{lo.getValue(), hi.getValue(), mayBeNaN};
@@ -273,8 +283,8 @@ InfixText::Term CStatements::variableTerm(Terms& progress, std::size_t i, bool& 
   std::size_t arity = static_cast<std::size_t>(arityOf(term.op));
   CVariable& variable = m_Variables.of(term.pVariable);
   if (variable.pVariable->isArray() != (term.op != TermOp::Variable))
-    throw Unemittable{"uses " + nameOf(term.pVariable) + (variable.pVariable->isArray() ? " without" : " with") +
-                      " an index"};
+    throw Unemittable{"uses " + nameOf(term.pVariable) +
+                      (variable.pVariable->isArray() ? " without" : " with") + " an index"};
   if (readsInput(term)) {
     std::string input = m_Variables.inputText(variable);
     if (progress.readsFirst) {
@@ -294,13 +304,14 @@ InfixText::Term CStatements::variableTerm(Terms& progress, std::size_t i, bool& 
     return InfixText::Term{read, "", "", read[0] == '(' ? kUnaryPrecedence : kAtomPrecedence};
   }
   if (term.op == TermOp::ElementRead) return elementReadTerm(variable, progress.integerOperand(arity, 0));
-  return elementWriteTerm(variable, progress.integerOperand(arity, 0), progress.rangeAt(progress.operandEnd(arity, 1)));
+  return elementWriteTerm(variable, progress.integerOperand(arity, 0),
+                          progress.rangeAt(progress.operandEnd(arity, 1)));
 }
 
 // The text around the index that names the element directly, where the index lies within the array
 // (as a literal, or as its range shows); nothing where it may not.
 std::optional<std::pair<std::string, std::string>> CStatements::directElement(CVariable& array,
-                                                                             const IntegerOperand& index) {
+                                                                              const IntegerOperand& index) {
   array.stored = true;
   double length = static_cast<double>(array.pVariable->getArrayLength());
   if (index.literal && *index.literal >= 0.0 && *index.literal < length)
@@ -316,10 +327,11 @@ InfixText::Term CStatements::elementReadTerm(CVariable& array, const IntegerOper
   std::optional<std::pair<std::string, std::string>> element = directElement(array, index);
   if (!element) {
     std::pair<std::string, std::string> view = integerView(index);
-    return InfixText::Term{"ssa_read_" + array.name + "(" + view.first, "", view.second + ")", kAtomPrecedence,
-                           {}, {hidden}};
+    return InfixText::Term{
+        "ssa_read_" + array.name + "(" + view.first, "", view.second + ")", kAtomPrecedence, {}, {hidden}};
   }
-  if (array.heldAsDouble) return InfixText::Term{element->first, "", element->second, kAtomPrecedence, {}, {hidden}};
+  if (array.heldAsDouble)
+    return InfixText::Term{element->first, "", element->second, kAtomPrecedence, {}, {hidden}};
   return InfixText::Term{"(double)" + element->first, "", element->second, kUnaryPrecedence, {}, {hidden}};
 }
 
@@ -330,10 +342,12 @@ InfixText::Term CStatements::elementWriteTerm(CVariable& array, const IntegerOpe
   std::optional<std::pair<std::string, std::string>> element = directElement(array, index);
   if (!element) {
     std::pair<std::string, std::string> view = integerView(index);
-    return InfixText::Term{"ssa_write_" + array.name + "(" + view.first, view.second + ", ", ")", 0, {}, {hidden}};
+    return InfixText::Term{
+        "ssa_write_" + array.name + "(" + view.first, view.second + ", ", ")", 0, {}, {hidden}};
   }
   std::pair<std::string, std::string> store = m_Variables.storeAround(array, value);
-  return InfixText::Term{element->first, element->second + " = " + store.first, store.second, 0, {}, {hidden}};
+  return InfixText::Term{element->first, element->second + " = " + store.first, store.second, 0, {},
+                         {hidden}};
 }
 
 std::vector<std::string> CStatements::statement(KvCCfgStatement& statement, const KvCControlFlowGraph& graph,
@@ -351,7 +365,8 @@ std::vector<std::string> CStatements::statement(KvCCfgStatement& statement, cons
 std::vector<std::string> CStatements::branch(KvCCfgExpression* pCondition, const std::string& jump) {
   m_Temporaries = 0;
   // A constant condition as C's truth value: "if (-2.0)" draws a warning of a changed value.
-  if (std::optional<double> number = constantOf(pCondition)) return {"if (" + std::string(*number != 0.0 ? "1" : "0") + ") " + jump};
+  if (std::optional<double> number = constantOf(pCondition))
+    return {"if (" + std::string(*number != 0.0 ? "1" : "0") + ") " + jump};
   Code condition = expression(pCondition, true);
   return scoped(condition.prelude, {"if (" + condition.text + ") " + jump});
 }
@@ -368,7 +383,8 @@ KvCCfgVariable* CStatements::onlyVariableOf(KvCCfgExpression* pExpression) {
                ? pTerms->getTerms()[0].pVariable
                : nullptr;
   auto* pMembers = dynamic_cast<KvCCfgVariableExpression*>(pExpression);
-  return pMembers && pMembers->getUsedVariables().size() == 1 ? *pMembers->getUsedVariables().begin() : nullptr;
+  return pMembers && pMembers->getUsedVariables().size() == 1 ? *pMembers->getUsedVariables().begin()
+                                                              : nullptr;
 }
 
 std::vector<std::string> CStatements::assignment(KvCCfgAssignment& assignment) {

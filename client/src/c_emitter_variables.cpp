@@ -48,7 +48,6 @@ const char* cTypeOf(const KV_DataType* pType) {
   return "double";
 }
 
-
 bool sameBits(double a, double b) { return a == b && std::signbit(a) == std::signbit(b); }
 
 // Whether the saturation limits, which a store keeps exactly, are values of the C type.
@@ -222,8 +221,8 @@ Around CVariables::storeAround(CVariable& variable, const std::optional<ValueRan
   if (declared.isScaled()) {
     const KV_Scaling& scaling = *declared.getScaling();
     if (scaling.getLSB() == 0.0) return leftOut;
-    return around({"ssa_represent(", ", " + doubleLiteral(scaling.getLSB()) + ", " +
-                                         doubleLiteral(scaling.getOffset()) + ")"},
+    return around({"ssa_represent(",
+                   ", " + doubleLiteral(scaling.getLSB()) + ", " + doubleLiteral(scaling.getOffset()) + ")"},
                   leftOut);
   }
   if (!variable.heldAsDouble && convertsExactly(declared.getDataType(), *range))
@@ -323,17 +322,20 @@ void addArrayHelpers(const CVariable& variable, const std::string& hook, std::ve
   helpers.push_back({"ssa_read_" + name, "static inline double ssa_read_" + name +
                                              "(int32_t ssa_i) {\n  return ssa_i >= 0 && ssa_i < " + length +
                                              " ? " + element + " : 0.0;\n}\n"});
-  helpers.push_back({"ssa_write_" + name, "static inline void ssa_write_" + name +
-                                              "(int32_t ssa_i, double ssa_new) {\n  if (ssa_i >= 0 && ssa_i < " +
-                                              length + ") " + name + "[ssa_i] = " + store + ";\n}\n"});
-  helpers.push_back({"ssa_fill_" + name, "static inline void ssa_fill_" + name + "(double ssa_new) {\n" + loop +
-                                             name + "[ssa_i] = " + store + ";\n}\n"});
+  helpers.push_back(
+      {"ssa_write_" + name, "static inline void ssa_write_" + name +
+                                "(int32_t ssa_i, double ssa_new) {\n  if (ssa_i >= 0 && ssa_i < " + length +
+                                ") " + name + "[ssa_i] = " + store + ";\n}\n"});
+  helpers.push_back({"ssa_fill_" + name, "static inline void ssa_fill_" + name + "(double ssa_new) {\n" +
+                                             loop + name + "[ssa_i] = " + store + ";\n}\n"});
   helpers.push_back({"ssa_observe_" + name, "static inline void ssa_observe_" + name +
                                                 "(void) {\n  int ssa_i;\n  ssa_array_begin(\"" +
-                                                declared.getName() + "\");\n  for (ssa_i = 0; ssa_i < " + length +
-                                                "; ++ssa_i) ssa_element(" + element + ");\n  ssa_array_end();\n}\n"});
-  helpers.push_back({"ssa_refill_" + name, "static inline void ssa_refill_" + name + "(void) {\n" + loop + name +
-                                               "[ssa_i] = " + refilledValue(variable, hook) + ";\n}\n"});
+                                                declared.getName() + "\");\n  for (ssa_i = 0; ssa_i < " +
+                                                length + "; ++ssa_i) ssa_element(" + element +
+                                                ");\n  ssa_array_end();\n}\n"});
+  helpers.push_back({"ssa_refill_" + name, "static inline void ssa_refill_" + name + "(void) {\n" + loop +
+                                               name + "[ssa_i] = " + refilledValue(variable, hook) +
+                                               ";\n}\n"});
 }
 
 }  // namespace

@@ -4,6 +4,7 @@
 // can still be optimistic about it.
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <initializer_list>
 #include <vector>
 
@@ -144,14 +145,16 @@ bool isPoint(const Interval& a) {
   return a.lo.isConstant() && a.hi.isConstant() && a.lo.getValue() == a.hi.getValue();
 }
 
-// The integer operators have no exact interval rule; with every operand known exactly, the result is
-// known exactly.
+// The integer operators have no exact interval rule: with every operand known exactly, the result is
+// known exactly; otherwise it is some 32-bit integer.
 Interval operatorInterval(TermOp op, const Interval* operands, int arity) {
   if (ssaopt::client::givesTruthValue(op)) return {KvCCfgValue(0.0), KvCCfgValue(1.0)};
-  bool exact = isPoint(operands[0]) && (arity == 1 || isPoint(operands[1]));
-  if (exact && ssaopt::client::isIntegerOperator(op))
-    return point(arity == 1 ? ssaopt::client::applyUnary(op, operands[0].lo)
-                            : ssaopt::client::applyBinary(op, operands[0].lo, operands[1].lo));
+  if (ssaopt::client::isIntegerOperator(op)) {
+    if (isPoint(operands[0]) && (arity == 1 || isPoint(operands[1])))
+      return point(arity == 1 ? ssaopt::client::applyUnary(op, operands[0].lo)
+                              : ssaopt::client::applyBinary(op, operands[0].lo, operands[1].lo));
+    return {KvCCfgValue(static_cast<double>(INT32_MIN)), KvCCfgValue(static_cast<double>(INT32_MAX))};
+  }
   return arity == 1 ? unaryInterval(op, operands[0]) : binaryInterval(op, operands[0], operands[1]);
 }
 

@@ -18,7 +18,8 @@ InfixText::Term literalTerm(double number) {
 
 InfixText::Term operatorTerm(TermOp op, const InfixText::Operand* operands) {
   std::string spelling = spellingOf(op);
-  if (op == TermOp::Abs || op == TermOp::Sgn) return InfixText::Term{spelling + "(", "", ")", kAtomPrecedence};
+  if (op == TermOp::Abs || op == TermOp::Sgn)
+    return InfixText::Term{spelling + "(", "", ")", kAtomPrecedence};
   if (arityOf(op) == 1) {
     // "-(-x)" rather than "--x", which reads as C's decrement.
     bool needed =
@@ -26,7 +27,10 @@ InfixText::Term operatorTerm(TermOp op, const InfixText::Operand* operands) {
     return InfixText::Term{spelling, "", "", kUnaryPrecedence, {needed, false}};
   }
   int precedence = precedenceOf(op);
-  return InfixText::Term{"", " " + spelling + " ", "", precedence,
+  return InfixText::Term{"",
+                         " " + spelling + " ",
+                         "",
+                         precedence,
                          {operands[0].precedence < precedence, operands[1].precedence <= precedence}};
 }
 

@@ -77,8 +77,12 @@ std::optional<double> declaredBound(const KvCCfgVariable& variable, bool upper) 
 
 }  // namespace
 
-std::optional<double> declaredLowerBound(const KvCCfgVariable& variable) { return declaredBound(variable, false); }
+std::optional<double> declaredLowerBound(const KvCCfgVariable& variable) {
+  return declaredBound(variable, false);
+}
 
-std::optional<double> declaredUpperBound(const KvCCfgVariable& variable) { return declaredBound(variable, true); }
+std::optional<double> declaredUpperBound(const KvCCfgVariable& variable) {
+  return declaredBound(variable, true);
+}
 
 }  // namespace ssaopt::client

@@ -210,6 +210,7 @@ TEST_F(EmittingC, ChecksThatRangesShowToBeNeedlessAreLeftOut) {
       "  tab[k] = s;\n"
       "  s = a * 10;\n"
       "  f = g;\n"
+      "  x = a << 2;\n"
       "  x = f * 5;\n"
       "  i = 3;\n"
       "  if in goto five else read;\n"
@@ -219,17 +220,23 @@ TEST_F(EmittingC, ChecksThatRangesShowToBeNeedlessAreLeftOut) {
       "  y = tab[i] + tab[x];\n"
       "}\n";
   std::string text = emit(program, {"ssa", "divide", "sccp"}, true).text;
-  EXPECT_TRUE(contains(text,
-                       "  x = (int16_t)SSA_RANGE(ssa_input_a() + 1.0, -127.0, 128.0);\n"
-                       "  s = (int16_t)SSA_RANGE(ssa_mul(ssa_input_k(), 10.0), 0.0, 50.0);\n"
-                       "  t = ssa_represent(SSA_RANGE(ssa_input_k(), 0.0, 5.0), 0.5, 0.0);\n"
-                       "  tab[(int32_t)SSA_RANGE(ssa_input_k(), 0.0, 5.0)] = (int16_t)SSA_RANGE((double)s, 0.0, 50.0);\n"
-                       "  s = ssa_store_s(ssa_mul(ssa_input_a(), 10.0));\n"
-                       "  f = SSA_RANGE_OR_NAN(ssa_input_g(), 0.2, 0.8);\n"
-                       "  x = ssa_to_int16(ssa_int(ssa_mul(f, 5.0)));\n"));
+  EXPECT_TRUE(contains(
+      text,
+      "  x = (int16_t)SSA_RANGE(ssa_input_a() + 1.0, -127.0, 128.0);\n"
+      "  s = (int16_t)SSA_RANGE(ssa_mul(ssa_input_k(), 10.0), 0.0, 50.0);\n"
+      "  t = ssa_represent(SSA_RANGE(ssa_input_k(), 0.0, 5.0), 0.5, 0.0);\n"
+      "  tab[(int32_t)SSA_RANGE(ssa_input_k(), 0.0, 5.0)] = (int16_t)SSA_RANGE((double)s, 0.0, 50.0);\n"
+      "  s = ssa_store_s(ssa_mul(ssa_input_a(), 10.0));\n"
+      "  f = SSA_RANGE_OR_NAN(ssa_input_g(), 0.2, 0.8);\n"
+      // An integer operator gives a 32-bit integer: its integer view needs no check.
+      "  x = ssa_to_int16((int32_t)SSA_RANGE(ssa_shl((int32_t)SSA_RANGE(ssa_input_a(), -128.0, 127.0), 2), "
+      "-2147483648.0, 2147483647.0));\n"
+      "  x = ssa_to_int16(ssa_int(ssa_mul(f, 5.0)));\n"));
   // The sum may leave int16 but not the 32-bit range: it wraps, from its integer view without check.
-  EXPECT_TRUE(contains(text, "  y = ssa_to_int16((int32_t)SSA_RANGE((double)tab[(int32_t)SSA_RANGE((double)i, 3.0, "
-                             "5.0)] + (double)tab[(int32_t)SSA_RANGE((double)x, 1.0, 4.0)], -65536.0, 65534.0));\n"));
+  EXPECT_TRUE(
+      contains(text,
+               "  y = ssa_to_int16((int32_t)SSA_RANGE((double)tab[(int32_t)SSA_RANGE((double)i, 3.0, "
+               "5.0)] + (double)tab[(int32_t)SSA_RANGE((double)x, 1.0, 4.0)], -65536.0, 65534.0));\n"));
   EXPECT_TRUE(contains(text, "#define SSA_RANGE(x, lo, hi) (x)\n"));
   EXPECT_FALSE(contains(emit(program, {"ssa", "divide", "sccp"}, false).text, "SSA_RANGE"));
 }
@@ -237,7 +244,8 @@ TEST_F(EmittingC, ChecksThatRangesShowToBeNeedlessAreLeftOut) {
 TEST_F(EmittingC, LongExpressionsAreWrittenWhole) {
   std::string sum = "b";
   for (int i = 1; i < 100000; ++i) sum += " + b";
-  std::string text = emit("var int32 a output = 0;\nvar int32 b = 1;\nproc #main {\n  a = " + sum + ";\n}\n").text;
+  std::string text =
+      emit("var int32 a output = 0;\nvar int32 b = 1;\nproc #main {\n  a = " + sum + ";\n}\n").text;
   std::string expected = "(double)b";
   for (int i = 1; i < 100000; ++i) expected += " + (double)b";
   EXPECT_NE(text.find("  a = ssa_to_int32(ssa_int(" + expected + "));\n"), std::string::npos);

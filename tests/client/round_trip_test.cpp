@@ -67,8 +67,8 @@ TEST_F(RoundTrip, LongAndDeeplyNestedExpressionsReadBackWhole) {
   for (int i = 1; i < 100000; ++i) sum += " + b";
   std::string nested = "b - b";
   for (int i = 1; i < 900; ++i) nested = "b - (" + nested + ")";
-  std::string printed = printTwice("var int32 a;\nvar int32 b;\n\nproc #main {\n  a = " + sum + ";\n  a = " +
-                                   nested + ";\n}\n");
+  std::string printed = printTwice("var int32 a;\nvar int32 b;\n\nproc #main {\n  a = " + sum +
+                                   ";\n  a = " + nested + ";\n}\n");
   EXPECT_NE(printed.find("  a = " + sum + ";\n  a = " + nested + ";\n"), std::string::npos);
 }
 

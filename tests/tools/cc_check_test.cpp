@@ -41,7 +41,8 @@ TEST(ToolCcCheck, EveryExampleCompilesWithEachCompilerAndBehavesAsInterpreted) {
     for (const char* name : kExamples) {
       Result result = ccCheckWith(compiler, example(name) + " --runs 3");
       EXPECT_EQ(result.status, 0) << compiler << " " << name << "\n" << result.out << result.err;
-      EXPECT_EQ(result.out, "same behaviour on 3 runs (interpreter and compiled C)\n") << compiler << " " << name;
+      EXPECT_EQ(result.out, "same behaviour on 3 runs (interpreter and compiled C)\n")
+          << compiler << " " << name;
     }
   }
   if (compilers == 0) GTEST_SKIP() << "neither gcc nor clang is installed";
@@ -94,13 +95,15 @@ TEST(ToolCcCheck, ReportsWhereACompiledProgramComputesDifferently) {
 
 TEST(ToolCcCheck, SplitsTheCompilerCommandAsAShellWould) {
   std::string arguments = pathOf("arguments");
-  std::string compiler = fileWith("cc", "#!/bin/sh\nprintf '%s\\n' \"$@\" >> " + arguments + "\nexec cc \"$@\"\n");
+  std::string compiler =
+      fileWith("cc", "#!/bin/sh\nprintf '%s\\n' \"$@\" >> " + arguments + "\nexec cc \"$@\"\n");
   chmod(compiler.c_str(), 0700);
   Result result = ccCheckWith(compiler + " -DLABEL='one two' \"-DQUOTED=\\\"x\\\"\" -Wno-unused-function",
                               example("loop") + " --runs 1");
   EXPECT_EQ(result.status, 0) << result.out << result.err;
   std::string passed = tooltest::contentsOf(arguments);
-  EXPECT_NE(passed.find("\n-DLABEL=one two\n-DQUOTED=\"x\"\n-Wno-unused-function\n-std=c99\n"), std::string::npos)
+  EXPECT_NE(passed.find("\n-DLABEL=one two\n-DQUOTED=\"x\"\n-Wno-unused-function\n-std=c99\n"),
+            std::string::npos)
       << passed;
 }
 
@@ -132,7 +135,8 @@ TEST(ToolEmitC, NoCompilerFusesTheRoundedProductsOfScaledStores) {
                             pathOf("scaled.c") + " 2>/dev/null";
       if (!hasCommand(compiler) || std::system(command.c_str()) != 0) continue;  // not a compiler for x86
       ++compiled;
-      EXPECT_EQ(tooltest::contentsOf(assembly).find("vfmadd"), std::string::npos) << compiler << " " << dialect;
+      EXPECT_EQ(tooltest::contentsOf(assembly).find("vfmadd"), std::string::npos)
+          << compiler << " " << dialect;
     }
   if (compiled == 0) GTEST_SKIP() << "no compiler for x86 with fused multiply-add";
 }
