@@ -229,7 +229,8 @@ class Measurement:
         self.write_program(source, os.path.join(directory, "program.ssa"), directory)
         tool = self.options.tool
         run([tool, "--passes=", "--emit=c", "program.ssa", "-o", "before.c"], directory, 3600)
-        _, report, _ = run([tool, "--time-passes", "--emit=c", "program.ssa", "-o", "after.c"], directory, 3600)
+        _, report, tool_seconds = run([tool, "--time-passes", "--emit=c", "program.ssa", "-o", "after.c"], directory,
+                                      3600)
         pipeline = PIPELINE_TIME.search(report)
         hooks = set()
         for stage in ("before", "after"):
@@ -244,8 +245,11 @@ class Measurement:
                 f.write(f"static struct ssa_domain {hook}_domain = {{{i + 1}u * 0x2545F4914F6CDD1Du, {grid}, "
                         f"{float(low)!r}, {float(high)!r}, {lsb!r}, {offset!r}}};\n")
                 f.write(f"double {hook}(void) {{ return ssa_next(&{hook}_domain); }}\n")
+        # The pipeline's own time is wall-clock time; the tool's CPU time (reading, the pipeline and
+        # writing C) bounds the pipeline's CPU time from above on a machine shared with other work.
         record = {"name": name, "kind": kind, "statements": statements,
-                  "pipeline_ms": float(pipeline.group(1)) if pipeline else None, "results": {}}
+                  "pipeline_ms": float(pipeline.group(1)) if pipeline else None,
+                  "tool_cpu_s": round(tool_seconds, 4), "results": {}}
         for compiler, command in self.compilers.items():
             tag = re.sub(r"\W+", "_", compiler)
             run(command + ["-std=c99", "-O2", "-c", "driver.c", "-o", f"driver_{tag}.o"], directory, 600)
@@ -332,11 +336,10 @@ def goals(records, keys):
                 x = ratio(r, key, "text")
                 lines.append((f"{key}: {r['name']}, text after/before <= 0.70", x is not None and x <= 0.70,
                               f"{x:.3f}" if x is not None else "n/a"))
-            if r["kind"] == "shape" and r["statements"] == 10000 and key.split()[0] in ("gcc", "cc") \
-                    and r["pipeline_ms"] is not None:
-                share = r["pipeline_ms"] / 1000 / r["results"][key]["before"]["compile_s"]
-                lines.append((f"{key}: {r['name']}, pipeline time < 2 % of compiling the original", share < 0.02,
-                              f"{100 * share:.2f} %"))
+            if r["kind"] == "shape" and r["statements"] == 10000 and key.split()[0] in ("gcc", "cc"):
+                share = r["tool_cpu_s"] / r["results"][key]["before"]["compile_s"]
+                lines.append((f"{key}: {r['name']}, pipeline time (at most the tool's CPU time) < 2 % of "
+                              "compiling the original", share < 0.02, f"{100 * share:.2f} %"))
             if r["kind"] == "shape":
                 x = ratio(r, key, "steps_per_s")
                 if x is not None:
@@ -399,7 +402,9 @@ def main():
                     print(row(record, key), flush=True)
     except Failure as failure:
         sys.exit(f"code-size: {failure}\n(work directory {work})")
-    if not options.keep:
+    if options.keep:
+        print(f"kept the work directory {work}")
+    else:
         shutil.rmtree(work)
 
     summary = summarise(records, keys)
