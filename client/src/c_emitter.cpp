@@ -50,6 +50,7 @@ public:
 
   EmittedC emit() {
     findPlacedParameters();
+    findBlocksByProcedure();
     findRedundantInitialStores();
     std::string code = proceduresText() + "\n" + stepFunctionsText() + outputsText();
     std::vector<detail::CHelper> variableHelpers = m_Variables.helpers();
@@ -197,9 +198,15 @@ private:
     std::vector<edge> out = controlOut(entry);
     if (out.size() == 1) place(m_Graph.target(out.front()));
     for (node v : procedure.blocks) place(v);
-    for (node v : m_Graph.nodes())
-      if (m_Graph.getBasicBlock(v) && m_Graph.inf(v)->getProcedure() == procedure.pProcedure) place(v);
+    if (auto all = m_BlocksByProcedure.find(procedure.pProcedure); all != m_BlocksByProcedure.end())
+      for (node v : all->second) place(v);
     return blocks;
+  }
+
+  // Every block of each procedure in node order, found in one pass over the graph.
+  void findBlocksByProcedure() {
+    for (node v : m_Graph.nodes())
+      if (m_Graph.getBasicBlock(v)) m_BlocksByProcedure[m_Graph.inf(v)->getProcedure()].push_back(v);
   }
 
   void assignLabels(Function& function) const {
@@ -347,6 +354,7 @@ private:
   bool m_ArgumentsAtCalls;
   CStatements m_Statements;
   std::unordered_set<const KvCCfgStatement*> m_RedundantStores;
+  std::unordered_map<const KvCCfgProcedure*, std::vector<node>> m_BlocksByProcedure;
 };
 
 }  // namespace
