@@ -3,7 +3,7 @@
 set -euo pipefail
 
 packages=(g++ cmake ninja-build libgtest-dev libgmock-dev libbenchmark-dev graphviz clang libclang-rt-14-dev
-          valgrind doxygen)
+          valgrind doxygen python3)
 
 missing=()
 for package in "${packages[@]}"; do
