@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Builds the front end's libFuzzer target with clang (in build-fuzz) and runs it for SECONDS seconds
-# (default 60) on a corpus seeded with the examples, the programs of the regression tests and inputs
-# kept from earlier runs (tests/fuzzing/corpus), and generated programs. Findings are written to
+# (default 60) on a corpus seeded with the examples, the programs of the file tests
+# (tests/filetests), inputs kept from earlier runs (tests/fuzzing/corpus), and generated programs. Findings are written to
 # build-fuzz/findings; the script fails when there is one.
 set -euo pipefail
 cd "$(dirname "$0")/.."
@@ -16,6 +16,7 @@ corpus=build-fuzz/corpus
 findings=build-fuzz/findings
 mkdir -p "$corpus" "$findings"
 cp examples/*.ssa tests/fuzzing/corpus/*.ssa "$corpus/"
+for test in tests/filetests/*/*.ssa; do cp "$test" "$corpus/filetest-$(basename "$(dirname "$test")")-$(basename "$test")"; done
 for seed in $(seq 1 20); do
   build-fuzz/tools/ssaopt generate --seed "$seed" > "$corpus/generated-$seed.ssa"
 done

@@ -1,8 +1,7 @@
 #include "behaviour.h"
 
-#include <fstream>
 #include <memory>
-#include <sstream>
+#include <optional>
 
 #include "exit_status.h"
 #include "passes.h"
@@ -33,8 +32,9 @@ public:
 private:
   int run(const std::vector<std::string>& pipeline) {
     std::unique_ptr<client::Program> pProgram = load(pipeline, true);
-    std::unique_ptr<client::InputStreams> pInputs = openInputs();
-    if (!pProgram || !pInputs) return kFailure;
+    if (!pProgram) return kFailure;
+    std::unique_ptr<client::InputStreams> pInputs = openInputs(*pProgram);
+    if (!pInputs) return kFailure;
     client::RunLimits limits;
     limits.steps = m_Options.steps.value_or(kDefaultSteps);
     m_Out << client::formatTrace(client::Interpreter(*pProgram).run(limits, *pInputs));
@@ -58,20 +58,33 @@ private:
     return loadProgramAndRunPipeline(m_Options.inputPath, pipeline, showWarnings, m_Err);
   }
 
-  std::unique_ptr<client::InputStreams> openInputs() {
+  // Seeded streams, or the values of the --inputs file ("-": standard input), which may name only
+  // the program's inputs.
+  std::unique_ptr<client::InputStreams> openInputs(const client::Program& program) {
     if (!m_Options.inputsPath)
       return std::make_unique<client::SeededInputs>(m_Options.seed.value_or(kDefaultSeed));
-    std::ifstream file(*m_Options.inputsPath);
-    std::ostringstream text;
-    text << file.rdbuf();
-    std::string error = file.is_open() ? "" : "cannot read the file";
+    std::optional<std::string> text = client::readSourceText(*m_Options.inputsPath);
+    std::string error = text ? "" : "cannot read the file";
     std::optional<client::ListedInputs> inputs;
-    if (error.empty()) inputs = client::ListedInputs::parse(text.str(), error);
-    if (!inputs) {
-      m_Err << "ssaopt: " << *m_Options.inputsPath << ": " << error << "\n";
+    if (error.empty()) inputs = client::ListedInputs::parse(*text, error);
+    if (inputs) error = unknownInput(*inputs, program);
+    if (!error.empty()) {
+      m_Err << "ssaopt: " << client::displayName(*m_Options.inputsPath) << ": " << error << "\n";
       return nullptr;
     }
     return std::make_unique<client::ListedInputs>(std::move(*inputs));
+  }
+
+  // Values only a volatile variable or an array can take: a misspelt name would leave its variable
+  // without them unnoticed.
+  static std::string unknownInput(const client::ListedInputs& inputs, const client::Program& program) {
+    for (const std::string& name : inputs.variableNames()) {
+      const KvCCfgSFVariable* pVariable = program.findVariable(name);
+      if (!pVariable) return "'" + name + "' is not a variable of the program";
+      if (!pVariable->isVolatile() && !pVariable->isArray())
+        return "'" + name + "' is not an input of the program (neither volatile nor an array)";
+    }
+    return "";
   }
 
   const Options& m_Options;

@@ -1,14 +1,10 @@
 #include "cc_check.h"
 
-#include <fcntl.h>
-#include <spawn.h>
-#include <sys/wait.h>
 #include <unistd.h>
 
 #include <cctype>
 #include <chrono>
 #include <cmath>
-#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -18,17 +14,15 @@
 #include <memory>
 #include <optional>
 #include <sstream>
-#include <thread>
 
 #include "exit_status.h"
 #include "passes.h"
+#include "process.h"
 #include "ssaopt/client/c_emitter.h"
 #include "ssaopt/client/front_end.h"
 #include "ssaopt/client/interpreter.h"
 #include "ssaopt/frame/control.h"
 #include "ssaopt/frame/pool.h"
-
-extern char** environ;
 
 namespace ssaopt::tool {
 
@@ -203,78 +197,6 @@ std::vector<std::string> shellWords(const std::string& line) {
   if (word) words.push_back(*word);
   return words;
 }
-
-// ---- Processes -------------------------------------------------------------------------------------
-
-struct Outcome {
-  bool started = false;
-  bool timedOut = false;
-  int status = -1;  // the exit status, or -1 after a signal
-  std::string out;
-  std::string err;
-};
-
-std::string contentsOf(const fs::path& path) {
-  std::ifstream file(path, std::ios::binary);
-  std::ostringstream text;
-  text << file.rdbuf();
-  return text.str();
-}
-
-// Runs `arguments` (the first found on the PATH) with standard input from `input` ("" for none) and
-// its output captured, killing it after `timeout`.
-Outcome runProcess(const std::vector<std::string>& arguments, const fs::path& input,
-                   const fs::path& directory, std::chrono::seconds timeout) {
-  fs::path outPath = directory / "stdout", errPath = directory / "stderr";
-  posix_spawn_file_actions_t actions;
-  posix_spawn_file_actions_init(&actions);
-  posix_spawn_file_actions_addopen(&actions, 0, input.empty() ? "/dev/null" : input.c_str(), O_RDONLY, 0);
-  posix_spawn_file_actions_addopen(&actions, 1, outPath.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
-  posix_spawn_file_actions_addopen(&actions, 2, errPath.c_str(), O_WRONLY | O_CREAT | O_TRUNC, 0600);
-  std::vector<char*> argv;
-  for (const std::string& argument : arguments) argv.push_back(const_cast<char*>(argument.c_str()));
-  argv.push_back(nullptr);
-  Outcome outcome;
-  pid_t pid = 0;
-  outcome.started = posix_spawnp(&pid, argv[0], &actions, nullptr, argv.data(), environ) == 0;
-  posix_spawn_file_actions_destroy(&actions);
-  if (!outcome.started) return outcome;
-  auto deadline = std::chrono::steady_clock::now() + timeout;
-  int status = 0;
-  while (waitpid(pid, &status, WNOHANG) == 0) {
-    if (std::chrono::steady_clock::now() > deadline) {
-      kill(pid, SIGKILL);
-      waitpid(pid, &status, 0);
-      outcome.timedOut = true;
-      break;
-    }
-    std::this_thread::sleep_for(std::chrono::milliseconds(1));
-  }
-  outcome.status = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-  outcome.out = contentsOf(outPath);
-  outcome.err = contentsOf(errPath);
-  return outcome;
-}
-
-// A directory of our own, removed with everything in it at the end.
-class TemporaryDirectory {
-public:
-  TemporaryDirectory() {
-    std::string pattern = (fs::temp_directory_path() / "ssaopt-cc-XXXXXX").string();
-    if (mkdtemp(pattern.data())) m_Path = pattern;
-  }
-  ~TemporaryDirectory() {
-    std::error_code ignored;
-    if (!m_Path.empty()) fs::remove_all(m_Path, ignored);
-  }
-  TemporaryDirectory(const TemporaryDirectory&) = delete;
-  TemporaryDirectory& operator=(const TemporaryDirectory&) = delete;
-
-  const fs::path& path() const { return m_Path; }
-
-private:
-  fs::path m_Path;
-};
 
 // ---- Traces -----------------------------------------------------------------------------------------
 
@@ -505,7 +427,7 @@ private:
   ssaopt::PoolMemController m_Pool;
   ssaopt::PoolMemController::Scope m_PoolScope{&m_Pool};
   KvCSSAControl m_Control;
-  TemporaryDirectory m_Directory;
+  TemporaryDirectory m_Directory{"ssaopt-cc"};
   std::vector<Binary> m_Binaries;
 };
 

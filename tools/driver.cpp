@@ -5,9 +5,12 @@
 #include <iomanip>
 #include <memory>
 #include <optional>
+#include <sstream>
 
 #include "exit_status.h"
+#include "pass_printing.h"
 #include "passes.h"
+#include "report.h"
 #include "ssaopt/client/c_emitter.h"
 #include "ssaopt/client/dot.h"
 #include "ssaopt/client/front_end.h"
@@ -26,20 +29,24 @@ using Clock = std::chrono::steady_clock;
 class Run {
 public:
   Run(const Options& options, std::ostream& out, std::ostream& err)
-      : m_Options(options), m_Out(out), m_Err(err) {}
+      : m_Options(options), m_Out(out), m_Err(err), m_Printer(options, err) {}
 
   int execute() {
     std::vector<std::string> pipeline = m_Options.passes.value_or(defaultPipeline());
     m_Control.boot();
     if (m_Options.verify) m_Verification.emplace();
+    if (m_Options.emit == Emit::Html) m_Report.emplace(m_Options);
     if (!load()) return kFailure;
+    if (!findFilteredProcedure()) return kMisuse;
     if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), "the front end");
-    GraphCounts before = countGraph(m_pProgram->graph());
+    GraphCounts before = m_Counting ? countGraph(m_pProgram->graph()) : GraphCounts();
+    if (m_Report) m_Report->addStep("the front end", *m_pProgram, 0.0);
     for (const std::string& name : pipeline) runPass(*findPass(name));
     writeNotices();
-    bool written = writeResult();
-    if (m_Options.stats) writeStatistics(m_Err, before, countGraph(m_pProgram->graph()), m_Removed);
-    if (m_Options.timePasses) writeTimes();
+    std::string statistics = m_Counting ? statisticsText(before) : "", times = timesText();
+    bool written = writeResult(statistics, times);
+    if (m_Options.stats) m_Err << statistics;
+    if (m_Options.timePasses) m_Err << times;
     bool verified = !m_Verification || m_Verification->writeReports(m_Err);
     m_Control.shutdown();
     return written && verified ? kSuccess : kFailure;
@@ -47,71 +54,113 @@ public:
 
 private:
   bool load() {
-    client::LoadResult loaded = client::loadProgramFile(m_Options.inputPath);
+    m_Source = client::readSourceText(m_Options.inputPath).value_or("");
+    client::LoadResult loaded = client::loadProgram(m_Source);
     for (const client::Diagnostic& diagnostic : loaded.diagnostics)
       m_Err << client::formatDiagnostic(m_Options.inputPath, diagnostic) << "\n";
     m_pProgram = std::move(loaded.program);
     return m_pProgram != nullptr;
   }
 
+  // A procedure to print alone must be in the program as read.
+  bool findFilteredProcedure() {
+    if (!m_Options.filterProcedure || m_pProgram->graph().findProcedure(m_Options.filterProcedure->c_str()))
+      return true;
+    m_Err << "ssaopt: --filter-procedure: no procedure '" << *m_Options.filterProcedure << "' in "
+          << client::displayName(m_Options.inputPath) << "\n";
+    return false;
+  }
+
   void runPass(const Pass& pass) {
-    GraphCounts ahead = m_Options.stats ? countGraph(m_pProgram->graph()) : GraphCounts();
+    GraphCounts ahead = m_Counting ? countGraph(m_pProgram->graph()) : GraphCounts();
+    m_Printer.beforePass(pass.name, *m_pProgram);
     Clock::time_point start = Clock::now();
     pass.run(*m_pProgram);
-    m_Times.emplace_back(pass.name, std::chrono::duration<double, std::milli>(Clock::now() - start).count());
-    if (m_Options.stats) m_Removed.add(ahead, countGraph(m_pProgram->graph()));
-    if (m_Options.printAfterAll)
-      m_Err << "// ---- after " << pass.name << " ----\n" << client::printProgram(*m_pProgram);
+    double milliseconds = std::chrono::duration<double, std::milli>(Clock::now() - start).count();
+    m_Times.emplace_back(pass.name, milliseconds);
+    if (m_Counting) m_Removed.add(ahead, countGraph(m_pProgram->graph()));
+    m_Printer.afterPass(pass.name, *m_pProgram);
+    if (m_Report) m_Report->addStep(pass.name, *m_pProgram, milliseconds);
     if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), std::string("pass ") + pass.name);
   }
 
-  // What the client's expressions noticed while the passes ran.
+  // What the client's expressions noticed while the passes ran, shown at their place in the source.
   void writeNotices() {
+    std::vector<client::Diagnostic> notices;
     for (const client::Notice& notice : m_pProgram->expressions().notices())
-      m_Err << client::formatDiagnostic(m_Options.inputPath,
-                                        {client::Severity::Warning, notice.pos, notice.message})
-            << "\n";
+      notices.push_back({client::Severity::Warning, notice.pos, notice.message});
+    client::attachSourceLines(notices, m_Source);
+    for (const client::Diagnostic& notice : notices)
+      m_Err << client::formatDiagnostic(m_Options.inputPath, notice) << "\n";
   }
 
-  bool writeResult() {
-    std::string result = m_Options.emit == Emit::Dot ? client::writeDot(*m_pProgram)
-                         : m_Options.emit == Emit::C
-                             ? client::emitC(*m_pProgram, client::EmitOptions{!m_Options.keepChecks}).text
-                             : client::printProgram(*m_pProgram, client::PrintOptions{m_Options.showValues});
-    if (m_Options.outputPath.empty()) {
-      m_Out << result;
+  std::string result(const std::string& statistics, const std::string& times) const {
+    std::string procedure = m_Options.filterProcedure.value_or("");
+    switch (m_Options.emit) {
+      case Emit::Dot:
+        return client::writeDot(*m_pProgram, client::DotOptions{m_Options.showValues, procedure});
+      case Emit::C:
+        return client::emitC(*m_pProgram, client::EmitOptions{!m_Options.keepChecks}).text;
+      case Emit::Html:
+        return m_Report->page(statistics, times);
+      case Emit::Text:
+        break;
+    }
+    client::PrintOptions options;
+    options.showValues = m_Options.showValues;
+    options.procedure = procedure;
+    return client::printProgram(*m_pProgram, options);
+  }
+
+  bool writeResult(const std::string& statistics, const std::string& times) {
+    std::string text = result(statistics, times);
+    if (m_Options.outputPath.empty() || m_Options.outputPath == "-") {
+      m_Out << text;
       return true;
     }
     std::ofstream file(m_Options.outputPath, std::ios::binary);
-    file << result;
+    file << text;
     if (file.flush()) return true;
     m_Err << "ssaopt: cannot write '" << m_Options.outputPath << "'\n";
     return false;
   }
 
-  void writeTimes() {
+  std::string statisticsText(const GraphCounts& before) const {
+    std::ostringstream text;
+    writeStatistics(text, before, countGraph(m_pProgram->graph()), m_Removed);
+    return text.str();
+  }
+
+  std::string timesText() const {
+    std::ostringstream text;
     double total = 0;
     for (const auto& time : m_Times) {
-      m_Err << "time " << std::left << std::setw(20) << time.first << std::right << std::fixed
-            << std::setprecision(3) << std::setw(12) << time.second << " ms\n";
+      text << "time " << std::left << std::setw(20) << time.first << std::right << std::fixed
+           << std::setprecision(3) << std::setw(12) << time.second << " ms\n";
       total += time.second;
     }
-    m_Err << "time " << std::left << std::setw(20) << "total" << std::right << std::setw(12) << total
-          << " ms\n";
+    text << "time " << std::left << std::setw(20) << "total" << std::right << std::fixed << std::setprecision(3)
+         << std::setw(12) << total << " ms\n";
     // What the library held at most, from reading the program to the end of the last pass.
-    m_Err << "peak memory " << std::left << std::setw(14) << "" << std::right << std::setw(12)
-          << std::setprecision(1) << static_cast<double>(m_Pool.peakBytes()) / 1024 << " KiB\n";
+    text << "peak memory " << std::left << std::setw(14) << "" << std::right << std::setw(12)
+         << std::setprecision(1) << static_cast<double>(m_Pool.peakBytes()) / 1024 << " KiB\n";
+    return text.str();
   }
 
   const Options& m_Options;
   std::ostream& m_Out;
   std::ostream& m_Err;
+  // Counting the graph after every pass costs a walk over it, so only what shows the counts does.
+  bool m_Counting = m_Options.stats || m_Options.emit == Emit::Html;
   // The pool takes back what the graph never deletes; it must outlive every object of the run, so it
   // comes first and the program last.
   ssaopt::PoolMemController m_Pool;
   ssaopt::PoolMemController::Scope m_PoolScope{&m_Pool};
   KvCSSAControl m_Control;
   std::optional<Verification> m_Verification;
+  PassPrinter m_Printer;
+  std::optional<Report> m_Report;
+  std::string m_Source;
   std::unique_ptr<client::Program> m_pProgram;
   std::vector<std::pair<std::string, double>> m_Times;
   RemovedCounts m_Removed;

@@ -12,6 +12,7 @@
 
 #include "exit_status.h"
 #include "passes.h"
+#include "process.h"
 #include "program_check.h"
 #include "shrink.h"
 #include "ssaopt/client/generator.h"
@@ -54,13 +55,6 @@ void installCrashReport() {
   sigemptyset(&action.sa_mask);
   for (std::size_t i = 0; i < std::size(kCrashSignals); ++i)
     sigaction(kCrashSignals[i], &action, &g_PreviousActions[i]);
-}
-
-// The executable of this process, which the determinism check runs again.
-std::string ownExecutable() {
-  std::vector<char> path(4096);
-  ssize_t length = readlink("/proc/self/exe", path.data(), path.size() - 1);
-  return length > 0 ? std::string(path.data(), static_cast<std::size_t>(length)) : "";
 }
 
 class GeneratorCommand {

@@ -1,5 +1,6 @@
 #include "options.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdlib>
 #include <iomanip>
@@ -13,6 +14,55 @@ namespace ssaopt::tool {
 
 namespace {
 
+// ---- Commands --------------------------------------------------------------------------------------
+
+struct CommandName {
+  Command command;
+  const char* name;  // as given on the command line; empty for the main command
+  const char* usage;
+};
+
+const CommandName kCommands[] = {
+    {Command::Transform, "", "ssaopt [options] FILE"},
+    {Command::Run, "run", "ssaopt run FILE [options]"},
+    {Command::Check, "check", "ssaopt check FILE [options]"},
+    {Command::CcCheck, "cc-check", "ssaopt cc-check FILE [options]"},
+    {Command::Reduce, "reduce", "ssaopt reduce FILE [options] [-- COMMAND ARGUMENT...]"},
+    {Command::Generate, "generate", "ssaopt generate [options]"},
+    {Command::Fuzz, "fuzz", "ssaopt fuzz [options]"},
+};
+
+constexpr unsigned bit(Command command) { return 1u << static_cast<unsigned>(command); }
+
+constexpr unsigned kMain = bit(Command::Transform);
+constexpr unsigned kRun = bit(Command::Run);
+constexpr unsigned kCheck = bit(Command::Check);
+constexpr unsigned kCcCheck = bit(Command::CcCheck);
+constexpr unsigned kReduce = bit(Command::Reduce);
+constexpr unsigned kGenerate = bit(Command::Generate);
+constexpr unsigned kFuzz = bit(Command::Fuzz);
+constexpr unsigned kReadingAProgram = kMain | kRun | kCheck | kCcCheck | kReduce;
+constexpr unsigned kAll = kReadingAProgram | kGenerate | kFuzz;
+
+std::string nameOf(Command command) {
+  for (const CommandName& entry : kCommands)
+    if (entry.command == command) return *entry.name ? entry.name : "the main command";
+  return "";
+}
+
+// "run, check and cc-check"
+std::string namesOf(unsigned commands) {
+  std::vector<std::string> names;
+  for (const CommandName& entry : kCommands)
+    if (commands & bit(entry.command)) names.push_back(nameOf(entry.command));
+  std::string joined;
+  for (std::size_t i = 0; i < names.size(); ++i)
+    joined += (i == 0 ? "" : i + 1 == names.size() ? " and " : ", ") + names[i];
+  return joined;
+}
+
+// ---- Values --------------------------------------------------------------------------------------
+
 std::vector<std::string> splitAtCommas(const std::string& list) {
   std::vector<std::string> items;
   std::istringstream in(list);
@@ -21,146 +71,301 @@ std::vector<std::string> splitAtCommas(const std::string& list) {
   return items;
 }
 
-bool isGeneratorCommand(Command command) { return command == Command::Generate || command == Command::Fuzz; }
+// A whole number of at least `least`; an error or "".
+std::string parseCount(const std::string& name, const std::string& text, std::uint64_t least,
+                       std::optional<std::uint64_t>& count) {
+  bool digits = !text.empty() && text.find_first_not_of("0123456789") == std::string::npos;
+  errno = 0;
+  std::uint64_t number = digits ? std::strtoull(text.c_str(), nullptr, 10) : 0;
+  if (!digits || errno != 0) return name + " needs a whole number, not '" + text + "'";
+  if (number < least) return name + " needs at least " + std::to_string(least);
+  count = number;
+  return "";
+}
 
-// The command a first argument names; Transform for any other argument.
-Command commandNamed(const std::string& argument) {
-  static const std::pair<const char*, Command> kCommands[] = {{"run", Command::Run},
-                                                              {"check", Command::Check},
-                                                              {"generate", Command::Generate},
-                                                              {"fuzz", Command::Fuzz},
-                                                              {"cc-check", Command::CcCheck}};
-  for (const auto& command : kCommands)
-    if (argument == command.first) return command.second;
-  return Command::Transform;
+template <typename Choice>
+std::string parseChoice(const std::string& name, const std::string& text,
+                        const std::vector<std::pair<const char*, Choice>>& choices, Choice& chosen) {
+  std::string known;
+  for (const auto& choice : choices) {
+    if (text == choice.first) {
+      chosen = choice.second;
+      return "";
+    }
+    known += (known.empty() ? "" : ", ") + std::string(choice.first);
+  }
+  return "unknown value '" + text + "' of " + name + "; use one of " + known;
+}
+
+// ---- The options -----------------------------------------------------------------------------------
+
+// The help texts below name the defaults.
+static_assert(kDefaultSteps == 10 && kDefaultRuns == 20 && kDefaultSeed == 1 && kDefaultPrograms == 100 &&
+              client::kDefaultProgramSize == 10);
+
+struct OptionSpec {
+  const char* name;
+  const char* value;  // what the value stands for in the usage; null for an option without value
+  unsigned commands;  // the commands that take it
+  const char* help;
+  // Stores the value; returns an error or "".
+  std::string (*apply)(Options& options, const std::string& value);
+};
+
+const OptionSpec kOptions[] = {
+    {"--passes", "LIST", kMain | kRun | kCheck | kCcCheck | kReduce | kFuzz,
+     "run these passes in order (comma-separated) instead of the default pipeline below; --passes= runs none (run: none unless given)",
+     [](Options& options, const std::string& value) {
+       options.passes = splitAtCommas(value);
+       return std::string();
+     }},
+    {"--emit", "FORMAT", kMain,
+     "write the result as program text (text, the default), as a Graphviz digraph (dot), as a C99 translation unit (c), or as an HTML report of every step (html)",
+     [](Options& options, const std::string& value) {
+       return parseChoice<Emit>("--emit", value,
+                                {{"text", Emit::Text}, {"dot", Emit::Dot}, {"c", Emit::C}, {"html", Emit::Html}},
+                                options.emit);
+     }},
+    {"-o", "FILE", kMain | kReduce, "write the result to FILE instead of standard output (-o -)",
+     [](Options& options, const std::string& value) {
+       options.outputPath = value;
+       return std::string();
+     }},
+    {"--show-values", nullptr, kMain,
+     "in text, dot and html output, show propagated values, ranges and executable edges",
+     [](Options& options, const std::string&) {
+       options.showValues = true;
+       return std::string();
+     }},
+    {"--print-after-all", nullptr, kMain, "print the program to standard error after every pass",
+     [](Options& options, const std::string&) {
+       options.printAfterAll = true;
+       return std::string();
+     }},
+    {"--print-before", "PASSES", kMain, "print the program to standard error before each pass named",
+     [](Options& options, const std::string& value) {
+       options.printBefore = splitAtCommas(value);
+       return std::string();
+     }},
+    {"--print-after", "PASSES", kMain, "print the program to standard error after each pass named",
+     [](Options& options, const std::string& value) {
+       options.printAfter = splitAtCommas(value);
+       return std::string();
+     }},
+    {"--print-changed", nullptr, kMain,
+     "print what each pass that changed the program changed, as a unified diff, to standard error",
+     [](Options& options, const std::string&) {
+       options.printChanged = true;
+       return std::string();
+     }},
+    {"--filter-procedure", "NAME", kMain,
+     "print only procedure NAME: in the output (text, dot, html) and in what the --print options print",
+     [](Options& options, const std::string& value) {
+       options.filterProcedure = value;
+       return value.empty() ? std::string("--filter-procedure needs a procedure name") : std::string();
+     }},
+    {"--keep-checks", nullptr, kMain | kCcCheck,
+     "in C output, keep each saturation, cast and index check that the propagated ranges show to be needless",
+     [](Options& options, const std::string&) {
+       options.keepChecks = true;
+       return std::string();
+     }},
+    {"--verify", nullptr, kMain,
+     "check the graph after every pass with internal checks on; report every internal error and consistency failure and exit with 1",
+     [](Options& options, const std::string&) {
+       options.verify = true;
+       return std::string();
+     }},
+    {"--stats", nullptr, kMain,
+     "count procedures, blocks, statements and phi functions before and after, constants found and definitions removed",
+     [](Options& options, const std::string&) {
+       options.stats = true;
+       return std::string();
+     }},
+    {"--time-passes", nullptr, kMain, "report the time each pass took and the peak memory",
+     [](Options& options, const std::string&) {
+       options.timePasses = true;
+       return std::string();
+     }},
+    {"--steps", "N", kRun | kCheck | kCcCheck | kReduce, "passes of #main per run (default 10)",
+     [](Options& options, const std::string& value) { return parseCount("--steps", value, 1, options.steps); }},
+    {"--runs", "R", kCheck | kCcCheck | kReduce, "runs, each on its own input streams (default 20)",
+     [](Options& options, const std::string& value) { return parseCount("--runs", value, 1, options.runs); }},
+    {"--seed", "S", kRun | kCheck | kCcCheck | kReduce | kGenerate | kFuzz,
+     "seed of the input streams, run r using S + r (default 1); of generate and fuzz, the (first) program",
+     [](Options& options, const std::string& value) { return parseCount("--seed", value, 0, options.seed); }},
+    {"--inputs", "VALUES", kRun,
+     "run on the values in file VALUES (- for standard input), a line NAME V1 V2 ... per input, instead of seeded streams",
+     [](Options& options, const std::string& value) {
+       options.inputsPath = value;
+       return std::string();
+     }},
+    {"--match", "TEXT", kReduce,
+     "count a failure as the same only when the command's output shows TEXT (instead of the first line of the original failure)",
+     [](Options& options, const std::string& value) {
+       options.match = value;
+       return std::string();
+     }},
+    {"--size", "N", kGenerate | kFuzz, "statements per procedure, roughly (default 10)",
+     [](Options& options, const std::string& value) { return parseCount("--size", value, 0, options.size); }},
+    {"--programs", "P", kFuzz, "programs fuzz checks (default 100)",
+     [](Options& options, const std::string& value) {
+       return parseCount("--programs", value, 1, options.programs);
+     }},
+    {"--color", "WHEN", kReadingAProgram,
+     "colour diagnostics: auto (when standard error is a terminal, the default), always or never",
+     [](Options& options, const std::string& value) {
+       return parseChoice<ColourMode>(
+           "--color", value, {{"auto", ColourMode::Auto}, {"always", ColourMode::Always}, {"never", ColourMode::Never}},
+           options.colour);
+     }},
+    {"--help", nullptr, kAll, "show this text",
+     [](Options& options, const std::string&) {
+       options.help = true;
+       return std::string();
+     }},
+    {"-h", nullptr, kAll, nullptr,
+     [](Options& options, const std::string&) {
+       options.help = true;
+       return std::string();
+     }},
+    {"--version", nullptr, kAll, "show the version",
+     [](Options& options, const std::string&) {
+       options.version = true;
+       return std::string();
+     }},
+};
+
+const OptionSpec* findOption(const std::string& name) {
+  for (const OptionSpec& option : kOptions)
+    if (name == option.name) return &option;
+  return nullptr;
 }
 
 bool startsWith(const std::string& text, const std::string& prefix) {
   return text.compare(0, prefix.size(), prefix) == 0;
 }
 
-// Sets the flag an option without value names; false for any other argument.
-bool parseFlag(const std::string& argument, Options& options) {
-  struct Flag {
-    const char* name;
-    bool Options::*field;
-  };
-  static const Flag kFlags[] = {
-      {"--print-after-all", &Options::printAfterAll},
-      {"--verify", &Options::verify},
-      {"--stats", &Options::stats},
-      {"--time-passes", &Options::timePasses},
-      {"--show-values", &Options::showValues},
-      {"--keep-checks", &Options::keepChecks},
-      {"--help", &Options::help},
-      {"-h", &Options::help},
-      {"--version", &Options::version},
-  };
-  for (const Flag& flag : kFlags)
-    if (argument == flag.name) {
-      options.*flag.field = true;
-      return true;
-    }
-  return false;
-}
+// ---- Parsing ---------------------------------------------------------------------------------------
 
-// The value of "NAME VALUE" or "NAME=VALUE" at argument i, moving i past it; empty for any other
-// argument.
-std::optional<std::string> optionValue(const std::vector<std::string>& arguments, std::size_t& i,
-                                       const std::string& name, std::string& error) {
-  const std::string& argument = arguments[i];
-  if (startsWith(argument, name + "=")) return argument.substr(name.size() + 1);
-  if (argument != name) return std::nullopt;
-  if (i + 1 == arguments.size()) {
-    error = name + " needs a value";
+class Parser {
+public:
+  explicit Parser(const std::vector<std::string>& arguments) : m_Arguments(arguments) {}
+
+  ParsedOptions parse() {
+    std::size_t i = 0;
+    if (!m_Arguments.empty())
+      for (const CommandName& entry : kCommands)
+        if (*entry.name && m_Arguments[0] == entry.name) {
+          m_Parsed.options.command = entry.command;
+          i = 1;
+        }
+    for (; i < m_Arguments.size() && m_Parsed.error.empty(); ++i) parseArgument(i);
+    if (m_Parsed.error.empty()) m_Parsed.error = checkTogether(m_Parsed.options);
+    return std::move(m_Parsed);
+  }
+
+private:
+  void parseArgument(std::size_t& i) {
+    const std::string& argument = m_Arguments[i];
+    if (argument == "--") {
+      endOfOptions(i);
+    } else if (startsWith(argument, "-") && argument != "-") {
+      parseOption(i);
+    } else {
+      setInput(argument);
+    }
+  }
+
+  // Reduce takes the command after "--"; for the others the arguments after it are files only.
+  void endOfOptions(std::size_t& i) {
+    std::vector<std::string> rest(m_Arguments.begin() + static_cast<std::ptrdiff_t>(i) + 1, m_Arguments.end());
+    i = m_Arguments.size();
+    if (m_Parsed.options.command == Command::Reduce) {
+      m_Parsed.options.reduceCommand = std::move(rest);
+      if (m_Parsed.options.reduceCommand.empty()) m_Parsed.error = "-- needs a command to follow it";
+      return;
+    }
+    for (const std::string& argument : rest)
+      if (m_Parsed.error.empty()) setInput(argument);
+  }
+
+  void setInput(const std::string& argument) {
+    if (!m_Parsed.options.inputPath.empty())
+      m_Parsed.error = "only one input file can be given";
+    else
+      m_Parsed.options.inputPath = argument;
+  }
+
+  // "--name=value", "--name value", "-oFILE", "-o FILE", or an option without value.
+  void parseOption(std::size_t& i) {
+    const std::string& argument = m_Arguments[i];
+    std::string name = argument;
+    std::optional<std::string> value;
+    if (startsWith(argument, "--") && argument.find('=') != std::string::npos) {
+      name = argument.substr(0, argument.find('='));
+      value = argument.substr(argument.find('=') + 1);
+    } else if (startsWith(argument, "-o") && argument.size() > 2) {
+      name = "-o";
+      value = argument.substr(2);
+    }
+    const OptionSpec* pOption = findOption(name);
+    std::string& error = m_Parsed.error;
+    if (!pOption) {
+      error = "unknown option '" + name + "'";
+    } else if (!(pOption->commands & bit(m_Parsed.options.command))) {
+      error = name + " is an option of " + namesOf(pOption->commands) + ", not of " +
+              nameOf(m_Parsed.options.command);
+    } else if (!pOption->value && value) {
+      error = name + " takes no value";
+    } else if (pOption->value && !value && i + 1 == m_Arguments.size()) {
+      error = name + " needs a value";
+    } else {
+      if (pOption->value && !value) value = m_Arguments[++i];
+      error = pOption->apply(m_Parsed.options, value.value_or(""));
+    }
+  }
+
+  // What only the whole command line shows.
+  static std::string checkTogether(const Options& options) {
+    if (options.help || options.version) return "";
+    bool readsFile = (bit(options.command) & kReadingAProgram) != 0;
+    if (readsFile && options.inputPath.empty()) return "no input file";
+    if (!readsFile && !options.inputPath.empty()) return nameOf(options.command) + " reads no file";
+    if (options.inputPath == "-" && options.inputsPath == std::string("-"))
+      return "standard input can give the program or the input values, not both";
+    std::vector<std::string> pipeline = options.passes.value_or(defaultPipeline());
+    if (options.passes) {
+      std::string error = findPipelineError(*options.passes);
+      if (!error.empty()) return error;
+    }
+    for (const auto& printed : {std::make_pair("--print-before", &options.printBefore),
+                                std::make_pair("--print-after", &options.printAfter)}) {
+      std::string error = checkPrintedPasses(printed.first, *printed.second, pipeline);
+      if (!error.empty()) return error;
+    }
+    bool forTheDefaultCommands = options.passes || options.runs || options.steps || options.seed;
+    if (options.command == Command::Reduce && !options.reduceCommand.empty() && forTheDefaultCommands)
+      return "--passes, --runs, --steps and --seed of reduce go to check and cc-check, which the command "
+             "after -- replaces";
+    if (options.filterProcedure && options.emit == Emit::C)
+      return "--filter-procedure does not apply to --emit=c, which needs the whole program";
     return "";
   }
-  return arguments[++i];
-}
 
-bool parseCount(const std::string& text, std::uint64_t& count) {
-  if (text.empty() || text.find_first_not_of("0123456789") != std::string::npos) return false;
-  errno = 0;
-  count = std::strtoull(text.c_str(), nullptr, 10);
-  return errno == 0;
-}
-
-// The options of run and check; false for any other argument.
-bool parseBehaviourOption(const std::vector<std::string>& arguments, std::size_t& i, Options& options,
-                          std::string& error) {
-  struct Count {
-    const char* name;
-    std::optional<std::uint64_t> Options::*field;
-  };
-  static const Count kCounts[] = {{"--steps", &Options::steps},
-                                  {"--runs", &Options::runs},
-                                  {"--seed", &Options::seed},
-                                  {"--size", &Options::size},
-                                  {"--programs", &Options::programs}};
-  for (const Count& count : kCounts) {
-    std::optional<std::string> value = optionValue(arguments, i, count.name, error);
-    if (!value) continue;
-    std::uint64_t number = 0;
-    if (error.empty() && !parseCount(*value, number))
-      error = std::string(count.name) + " needs a whole number, not '" + *value + "'";
-    options.*count.field = number;
-    return true;
+  static std::string checkPrintedPasses(const std::string& option, const std::vector<std::string>& names,
+                                        const std::vector<std::string>& pipeline) {
+    std::string unknown = findUnknownPass(names);
+    if (!unknown.empty()) return option + ": " + unknown;
+    for (const std::string& name : names)
+      if (std::find(pipeline.begin(), pipeline.end(), name) == pipeline.end())
+        return option + " names '" + name + "', which the pipeline does not run";
+    return "";
   }
-  std::optional<std::string> inputs = optionValue(arguments, i, "--inputs", error);
-  if (!inputs) return false;
-  options.inputsPath = inputs;
-  return true;
-}
 
-// Each command's own options, and none of another's.
-std::string checkCommandOptions(const Options& options) {
-  bool behaviourOptions = options.steps || options.runs || options.inputsPath;
-  bool generatorOptions = options.size || options.programs;
-  bool generates = isGeneratorCommand(options.command);
-  if (options.command == Command::Transform && (behaviourOptions || options.seed))
-    return "--steps, --runs, --seed and --inputs belong to the run and check commands";
-  if (options.command == Command::Run && options.runs) return "--runs belongs to the check command";
-  if ((options.command == Command::Check || options.command == Command::CcCheck) && options.inputsPath)
-    return "--inputs belongs to the run command";
-  if (generates && behaviourOptions)
-    return "--steps, --runs and --inputs belong to the run and check commands";
-  if (!generates && generatorOptions) return "--size and --programs belong to the generate and fuzz commands";
-  if (options.command == Command::Generate && options.programs)
-    return "--programs belongs to the fuzz command";
-  if (options.steps == 0u || options.runs == 0u) return "--steps and --runs need at least 1";
-  if (options.programs == 0u) return "--programs needs at least 1";
-  if (options.passes) return findPipelineError(*options.passes);
-  return "";
-}
-
-// Parses one argument, taking the next one too for "-o FILE"; returns an error or "".
-std::string parseArgument(const std::vector<std::string>& arguments, std::size_t& i, Options& options) {
-  const std::string& argument = arguments[i];
-  if (parseFlag(argument, options)) return "";
-  std::string error;
-  if (parseBehaviourOption(arguments, i, options, error)) return error;
-  if (startsWith(argument, "--passes=")) {
-    options.passes = splitAtCommas(argument.substr(9));
-  } else if (argument == "--emit=text") {
-    options.emit = Emit::Text;
-  } else if (argument == "--emit=dot") {
-    options.emit = Emit::Dot;
-  } else if (argument == "--emit=c") {
-    options.emit = Emit::C;
-  } else if (startsWith(argument, "--emit=")) {
-    return "unknown output format '" + argument.substr(7) + "'; use --emit=text, --emit=dot or --emit=c";
-  } else if (argument == "-o") {
-    if (++i == arguments.size()) return "-o needs a file name";
-    options.outputPath = arguments[i];
-  } else if (startsWith(argument, "-") && argument != "-") {
-    return "unknown option '" + argument + "'";
-  } else if (!options.inputPath.empty()) {
-    return "only one input file can be given";
-  } else {
-    options.inputPath = argument;
-  }
-  return "";
-}
+  const std::vector<std::string>& m_Arguments;
+  ParsedOptions m_Parsed;
+};
 
 // " (after ssa, divide)", " (before ssa)" or " (once)" for a pass that can run only there.
 std::string whereThePassRuns(const Pass& pass) {
@@ -171,94 +376,71 @@ std::string whereThePassRuns(const Pass& pass) {
   return std::string_view(pass.name) == "ssa" ? " (once)" : " (before ssa)";
 }
 
+// The option as the usage shows it, "--steps N" or "-o FILE".
+std::string spelling(const OptionSpec& option) {
+  if (!option.value) return option.name;
+  return std::string(option.name) + (startsWith(option.name, "--") ? "=" : " ") + option.value;
+}
+
+// The option, then its help and the commands that take it, wrapped to the width of a terminal.
+void writeOptionHelp(std::ostream& text, const OptionSpec& option) {
+  constexpr std::size_t kIndent = 27, kWidth = 80;
+  std::string help = option.help;
+  if (option.commands != kAll) help += " (" + namesOf(option.commands) + ")";
+  std::string line = "  " + spelling(option);
+  line += std::string(line.size() < kIndent ? kIndent - line.size() : 1, ' ');
+  std::istringstream words(help);
+  bool first = true;
+  for (std::string word; words >> word; first = false) {
+    if (!first && line.size() + 1 + word.size() > kWidth) {
+      text << line << "\n";
+      line = std::string(kIndent, ' ');
+    } else if (!first) {
+      line += ' ';
+    }
+    line += word;
+  }
+  text << line << "\n";
+}
+
 }  // namespace
 
-ParsedOptions parseOptions(const std::vector<std::string>& arguments) {
-  ParsedOptions parsed;
-  std::size_t first = 0;
-  if (!arguments.empty()) parsed.options.command = commandNamed(arguments[0]);
-  if (parsed.options.command != Command::Transform) first = 1;
-  for (std::size_t i = first; i < arguments.size() && parsed.error.empty(); ++i)
-    parsed.error = parseArgument(arguments, i, parsed.options);
-  const Options& options = parsed.options;
-  if (parsed.error.empty()) parsed.error = checkCommandOptions(options);
-  bool readsFile = !isGeneratorCommand(options.command);
-  if (parsed.error.empty() && !options.help && !options.version && readsFile && options.inputPath.empty())
-    parsed.error = "no input file";
-  if (parsed.error.empty() && !readsFile && !options.inputPath.empty())
-    parsed.error = "generate and fuzz read no file";
-  return parsed;
-}
+ParsedOptions parseOptions(const std::vector<std::string>& arguments) { return Parser(arguments).parse(); }
 
 std::string usageText() {
   std::ostringstream text;
-  text << "usage: ssaopt [options] FILE\n"
-          "       ssaopt run FILE [--passes=LIST] [--steps N] [--seed S] [--inputs VALUES]\n"
-          "       ssaopt check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S]\n"
-          "       ssaopt cc-check FILE [--passes=LIST] [--runs R] [--steps N] [--seed S] [--keep-checks]\n"
-          "       ssaopt generate [--seed S] [--size N]\n"
-          "       ssaopt fuzz [--programs P] [--seed S] [--size N] [--passes=LIST]\n"
+  for (std::size_t i = 0; i < std::size(kCommands); ++i)
+    text << (i == 0 ? "usage: " : "       ") << kCommands[i].usage << "\n";
+  text << "\n"
+          "The main command reads a program in the textual format (FILE, or - for standard input),\n"
+          "runs a pipeline of transformations on its control-flow graph and writes the result.\n"
+          "run prints the trace of one run of the program as written (or after --passes): every\n"
+          "external call with the values it uses, then the output variables. check runs the\n"
+          "program before and after the pipeline on R seeded input streams and reports the first\n"
+          "difference. cc-check compiles the C emitted before and after the pipeline ($CC, else cc)\n"
+          "and compares both with the interpreter on the same streams. reduce shrinks the program\n"
+          "while COMMAND (where {} stands for the program's file, else it comes last) fails the\n"
+          "same way, by default check and, where check finds nothing, cc-check; it writes the\n"
+          "smallest program found. generate writes a random valid program; the same seed gives the\n"
+          "same program. fuzz checks P generated programs (seeds S, S + 1, ...): no internal report,\n"
+          "a consistent graph after every pass, printed programs that read back, the same\n"
+          "behaviour before and after the pipeline, and (every tenth program) the same result from\n"
+          "another process; it writes each failing program to fuzz-SEED.ssa and a shrunk one to\n"
+          "fuzz-SEED-shrunk.ssa.\n"
           "\n"
-          "Reads a program in the textual format, runs a pipeline of transformations on its\n"
-          "control-flow graph and writes the result.\n"
-          "\n"
-          "run prints the trace of one run of the program as written (or after --passes=LIST):\n"
-          "every external call with the values it uses, then the output variables. check runs\n"
-          "the program before and after the pipeline on R seeded input streams and reports the\n"
-          "first difference; it exits with 1 when there is one. cc-check compiles the C emitted\n"
-          "before and after the pipeline ($CC, else cc) and compares both with the interpreter\n"
-          "on the same R streams.\n"
-          "  --steps N          passes of #main per run (default "
-       << kDefaultSteps
-       << ")\n"
-          "  --seed S           seed of the input streams; check's run r uses S + r (default "
-       << kDefaultSeed
-       << ")\n"
-          "  --runs R           runs of check (default "
-       << kDefaultRuns
-       << ")\n"
-          "  --inputs VALUES    run on the values in file VALUES, a line NAME V1 V2 ... per\n"
-          "                     volatile variable, instead of seeded streams\n"
-          "\n"
-          "generate writes a random valid program; the same seed gives the same program. fuzz\n"
-          "checks P generated programs (seeds S, S + 1, ...): no internal report, a consistent\n"
-          "graph after every pass, printed programs that read back, the same behaviour before\n"
-          "and after the pipeline, and (every tenth program) the same result from another\n"
-          "process. It writes each failing program to fuzz-SEED.ssa and a shrunk one to\n"
-          "fuzz-SEED-shrunk.ssa, with the command that shows the failure, and exits with 1.\n"
-          "  --size N           statements per procedure, roughly (default "
-       << client::kDefaultProgramSize
-       << ")\n"
-          "  --programs P       programs fuzz checks (default "
-       << kDefaultPrograms
-       << ")\n"
-          "\n"
-          "options:\n"
-          "  --passes=LIST      run these passes in order (comma-separated) instead of the\n"
-          "                     default pipeline below; --passes= runs none\n"
-          "  --print-after-all  print the program to standard error after every pass\n"
-          "  --emit=text|dot|c  write the result as program text (default), as Graphviz or as C\n"
-          "  -o FILE            write the result to FILE instead of standard output\n"
-          "  --show-values      in text output, show propagated values, ranges and executable edges\n"
-          "  --keep-checks      in C output (and cc-check), keep each saturation, cast and index\n"
-          "                     check that the propagated ranges show to be needless\n"
-          "  --verify           check the graph after every pass with internal checks on; report\n"
-          "                     every internal error and consistency failure and exit with 1\n"
-          "  --stats            count procedures, blocks, statements and phi functions before\n"
-          "                     and after, constants found and definitions removed\n"
-          "  --time-passes      report the time each pass took\n"
-          "  --help, -h         show this text\n"
-          "  --version          show the version\n"
-          "\n"
-          "passes:\n";
+          "options (--name=value and --name value alike):\n";
+  for (const OptionSpec& option : kOptions)
+    if (option.help) writeOptionHelp(text, option);
+  text << "\npasses:\n";
   for (const Pass& pass : passRegistry())
     text << "  " << std::left << std::setw(20) << pass.name << " " << pass.summary << whereThePassRuns(pass)
          << "\n";
   text << "\ndefault pipeline (the typical run):\n  " << joinedPassNames(defaultPipeline()) << "\n";
-  text << "\nexit status: 0 on success; 1 when the program has errors, a check or fuzz finds a\n"
-          "difference or failure, --verify reports, or the result cannot be written; 2 when the\n"
-          "command line is wrong (an unknown option or pass, a pass out of order, a bad number,\n"
-          "a missing or unreadable file), with one line on standard error.\n";
+  text << "\nexit status: 0 on success; 1 when the program has errors, a check, fuzz or reduce finds a\n"
+          "difference or failure (or reduce none to keep), --verify reports, or the result cannot be\n"
+          "written; 2 when the command line is wrong (an unknown option, command or pass, an option\n"
+          "of another command, a pass out of order, a bad number, a missing or unreadable file),\n"
+          "with one line on standard error.\n";
   return text.str();
 }
 

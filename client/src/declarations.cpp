@@ -109,12 +109,14 @@ void rejectOutliningNameClash(const SyntaxProgram& syntax) {
                             "; outlining names its procedures so");
 }
 
-std::vector<KvCCfgSFVariable*> declareFormals(const SyntaxProcedure& procedure, const Program& program) {
+std::vector<KvCCfgSFVariable*> declareFormals(const SyntaxProcedure& procedure, const Program& program,
+                                              const CheckState& state) {
   std::vector<KvCCfgSFVariable*> formals;
   if (!procedure.formals.empty() && procedure.name.text == KvCControlFlowGraph::kMainProcedureName)
     throw SourceError(procedure.formals.front().pos, "'#main' takes no parameters");
   for (const SyntaxName& formal : procedure.formals) {
     KvCCfgSFVariable* pVariable = program.findVariable(formal.text);
+    if (!pVariable && state.failedVariables.count(formal.text)) throw FollowUpError();
     if (!pVariable) throw SourceError(formal.pos, "unknown variable " + quoted(formal.text));
     if (pVariable->isArray())
       throw SourceError(formal.pos, "the array " + quoted(formal.text) + " cannot be a parameter");
@@ -134,32 +136,51 @@ bool variableHolds(const KvCCfgSFVariable& variable, double value) {
   return typeHolds(variable.getDataType(), stored);
 }
 
-void declareVariables(const SyntaxProgram& syntax, Program& program) {
+void declareVariables(const SyntaxProgram& syntax, Program& program, CheckState& state) {
   std::uint32_t index = 0;
   for (const SyntaxDeclaration& declaration : syntax.declarations) {
-    if (KvCCfgSFVariable* pEarlier = program.findVariable(declaration.name.text))
-      throw SourceError(declaration.name.pos, "variable " + quoted(declaration.name.text) +
-                                                  " is already declared at " +
-                                                  lineOf(pEarlier->getPosition()));
-    program.addVariable(declareVariable(declaration, index++));
+    try {
+      if (KvCCfgSFVariable* pEarlier = program.findVariable(declaration.name.text))
+        throw SourceError(declaration.name.pos, "variable " + quoted(declaration.name.text) +
+                                                    " is already declared at " +
+                                                    lineOf(pEarlier->getPosition()));
+      program.addVariable(declareVariable(declaration, index++));
+    } catch (const SourceError& error) {
+      state.diagnostics.error(error);
+      if (!program.findVariable(declaration.name.text)) state.failedVariables.insert(declaration.name.text);
+    }
   }
 }
 
-Signatures declareProcedures(const SyntaxProgram& syntax, Program& program) {
+Signatures declareProcedures(const SyntaxProgram& syntax, Program& program, CheckState& state) {
   Signatures signatures;
   for (const SyntaxProcedure& procedure : syntax.procedures) {
     auto found = signatures.find(procedure.name.text);
-    if (found != signatures.end())
-      throw SourceError(procedure.name.pos, "procedure " + quoted(procedure.name.text) +
-                                                " is already declared at " +
-                                                lineOf(found->second.pSyntax->name.pos));
-    Signature signature{&procedure, declareFormals(procedure, program)};
+    if (found != signatures.end()) {
+      state.diagnostics.error(procedure.name.pos, "procedure " + quoted(procedure.name.text) +
+                                                      " is already declared at " +
+                                                      lineOf(found->second.pSyntax->name.pos));
+      continue;
+    }
+    Signature signature{&procedure, {}};
+    try {
+      signature.formals = declareFormals(procedure, program, state);
+    } catch (const SourceError& error) {
+      state.diagnostics.error(error);
+      state.failedProcedures.insert(procedure.name.text);
+    } catch (const FollowUpError&) {
+      state.failedProcedures.insert(procedure.name.text);
+    }
     program.setFormals(std::string(procedure.name.text), signature.formals);
     signatures.emplace(procedure.name.text, std::move(signature));
   }
   if (!signatures.count(KvCControlFlowGraph::kMainProcedureName))
-    throw SourceError(syntax.endOfInput, "the program has no procedure '#main'");
-  rejectOutliningNameClash(syntax);
+    state.diagnostics.error(syntax.endOfInput, "the program has no procedure '#main'");
+  try {
+    rejectOutliningNameClash(syntax);
+  } catch (const SourceError& error) {
+    state.diagnostics.error(error);
+  }
   return signatures;
 }
 

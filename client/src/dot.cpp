@@ -4,12 +4,15 @@
 #include <unordered_map>
 
 #include "program_view.h"
+#include "ssaopt/ir/procedure.h"
+#include "ssaopt/ir/statement.h"
 #include "statement_text.h"
 
 namespace ssaopt::client {
 
 namespace {
 
+using detail::ProcedureView;
 using detail::ProgramView;
 using ssaopt::edge;
 using ssaopt::node;
@@ -35,93 +38,148 @@ std::string escapedForString(const std::string& text) {
 
 std::string nodeId(node v) { return "n" + std::to_string(v.index()); }
 
+constexpr const char* kNotExecutable = "color=red, fontcolor=red, style=dashed";
+constexpr const char* kCall = "style=dashed, color=blue, arrowhead=open";
+
 class DotWriter {
 public:
-  explicit DotWriter(const Program& program) : m_View(program), m_Graph(program.graph()) {}
+  DotWriter(const Program& program, const DotOptions& options)
+      : m_View(program), m_Graph(program.graph()), m_Options(options) {}
 
   std::string write() {
-    m_Out << "digraph program {\n  node [shape=record, fontname=\"monospace\", fontsize=10];\n";
-    groupNodesByProcedure();
-    for (std::size_t i = 0; i < m_View.procedures().size(); ++i) writeCluster(i);
-    for (node v : m_Unclustered) writeNode(v);
-    for (edge e : m_Graph.edges()) writeEdge(e);
-    m_Out << "}\n";
+    m_Out << "digraph program {\n"
+             "  graph [fontname=\"monospace\", fontsize=12];\n"
+             "  node [shape=record, fontname=\"monospace\", fontsize=10];\n"
+             "  edge [fontname=\"monospace\", fontsize=9];\n";
+    for (std::size_t i = 0; i < m_View.procedures().size(); ++i)
+      if (isShown(m_View.procedures()[i])) writeCluster(i);
+    m_Out << m_Edges.str() << "}\n";
     return m_Out.str();
   }
 
 private:
-  void groupNodesByProcedure() {
-    std::unordered_map<KvCCfgProcedure*, std::size_t> clusterOf;
-    for (std::size_t i = 0; i < m_View.procedures().size(); ++i)
-      clusterOf[m_View.procedures()[i].pProcedure] = i;
-    m_Members.resize(m_View.procedures().size());
-    for (node v : m_Graph.nodes()) {
-      auto found = clusterOf.find(m_Graph.inf(v) ? m_Graph.inf(v)->getProcedure() : nullptr);
-      if (found == clusterOf.end())
-        m_Unclustered.push_back(v);
-      else
-        m_Members[found->second].push_back(v);
-    }
+  bool isShown(const ProcedureView& procedure) const {
+    return m_Options.procedure.empty() || procedure.name == m_Options.procedure;
   }
 
   void writeCluster(std::size_t i) {
-    m_Out << "  subgraph cluster_" << i << " {\n    label=\"" << escapedForString(m_View.procedures()[i].name)
-          << "\";\n";
-    for (node v : m_Members[i]) {
-      m_Out << "  ";
-      writeNode(v);
+    const ProcedureView& procedure = m_View.procedures()[i];
+    m_Out << "  subgraph cluster_" << i << " {\n    label=\"" << escapedForString(procedure.name) << "\";\n";
+    node entry = procedure.pProcedure->getEntryNode();
+    m_Exit = procedure.pProcedure->getExitNode();
+    m_Out << "    " << nodeId(entry) << " [shape=ellipse, label=\"entry\"];\n";
+    if (m_Exit != ssaopt::nil) m_Out << "    " << nodeId(m_Exit) << " [shape=ellipse, label=\"end\"];\n";
+    std::vector<std::vector<node>> boxes = boxesOf(procedure);
+    for (const std::vector<node>& box : boxes) writeBox(box);
+    writeControlEdges(entry, entry);
+    for (const std::vector<node>& box : boxes) {
+      writeControlEdges(box.front(), box.back());
+      writeCallEdges(box);
     }
     m_Out << "  }\n";
   }
 
-  void writeNode(node v) {
-    KvCCfgNodeInfo* pInfo = m_Graph.inf(v);
-    KvCBasicBlock* pBlock = m_Graph.getBasicBlock(v);
-    m_Out << "  " << nodeId(v);
-    if (!pBlock)
-      m_Out << " [shape=ellipse, label=\"" << (pInfo && pInfo->isEntryNode() ? "entry" : "exit") << "\"];\n";
-    else
-      m_Out << " [label=\"{" << escapedForRecord(titleOf(v, *pBlock)) << contentsOf(v, *pBlock) << "}\"];\n";
+  // The shown blocks in print order, each run of blocks that fall into one another as one box.
+  std::vector<std::vector<node>> boxesOf(const ProcedureView& procedure) {
+    std::vector<std::vector<node>> boxes;
+    for (node v : procedure.blocks) {
+      if (boxes.empty() || m_View.continuationOf(boxes.back().back()) != v)
+        boxes.push_back({v});
+      else
+        boxes.back().push_back(v);
+      m_BoxOf[v.index()] = boxes.back().front();
+    }
+    return boxes;
   }
 
-  std::string titleOf(node v, const KvCBasicBlock& block) const {
-    const std::string& label = m_View.labelOf(v);
-    return label.empty() ? "bb" + std::to_string(block.getIndex()) : label;
+  // The box a block stands in, or the end.
+  std::string idOf(node v) const {
+    if (m_View.isEnd(v) && m_Exit != ssaopt::nil) return nodeId(m_Exit);
+    auto found = m_BoxOf.find(v.index());
+    return nodeId(found == m_BoxOf.end() ? v : found->second);
+  }
+
+  void writeBox(const std::vector<node>& box) {
+    std::string title = escapedForRecord(m_View.labelOf(box.front()));
+    std::string lines;
+    for (std::size_t i = 0; i < box.size(); ++i) {
+      if (i > 0 && !m_View.labelOf(box[i]).empty()) lines += line(m_View.labelOf(box[i]) + ":");
+      lines += contentsOf(box[i]);
+    }
+    std::string label = title.empty() || lines.empty() ? title + lines : title + "|" + lines;
+    m_Out << "    " << nodeId(box.front()) << " [label=\"{" << (label.empty() ? " " : label) << "}\"];\n";
   }
 
   // One left-justified line per phi function, statement and condition.
-  std::string contentsOf(node v, const KvCBasicBlock& block) const {
+  std::string contentsOf(node v) const {
+    const KvCBasicBlock& block = *m_Graph.getBasicBlock(v);
     std::string lines;
-    for (KvCPhiFunction* pPhi : block.getPhiFunctions()) lines += line(detail::phiText(m_View, *pPhi, v));
+    for (KvCPhiFunction* pPhi : block.getPhiFunctions())
+      lines += line(detail::phiText(m_View, *pPhi, v), pPhi->getVariable());
     for (KvCCfgStatement* pStatement : block.getStatementSeq())
-      lines += line(detail::statementText(m_View, *pStatement));
+      lines += line(detail::statementText(m_View, *pStatement), detail::definedVariable(*pStatement));
     if (block.getBranchCond()) lines += line("if " + detail::expressionText(m_View, block.getBranchCond()));
-    return lines.empty() ? "" : "|" + lines;
+    return lines;
   }
 
-  static std::string line(const std::string& text) { return escapedForRecord(text) + "\\l"; }
+  std::string line(const std::string& text, KvCCfgVariable* pDefined = nullptr) const {
+    std::string shown = text;
+    if (m_Options.showValues && pDefined) shown += "  // " + detail::propagatedText(*pDefined);
+    return escapedForRecord(shown) + "\\l";
+  }
 
-  void writeEdge(edge e) {
-    KvCCfgEdgeInfo* pInfo = m_Graph.inf(e);
-    m_Out << "  " << nodeId(m_Graph.source(e)) << " -> " << nodeId(m_Graph.target(e));
-    if (pInfo && pInfo->isSSAEdge())
-      m_Out << " [style=dashed, color=gray50, constraint=false]";
-    else if (pInfo && pInfo->isTrueBranch())
-      m_Out << " [label=\"T\"]";
-    else if (pInfo && pInfo->isFalseBranch())
-      m_Out << " [label=\"F\"]";
-    m_Out << ";\n";
+  // From the box that ends with block `last` (or from an entry node): to the boxes it leads to, or to
+  // the end, and to "removed" for a branch that dead-code elimination took away.
+  void writeControlEdges(node box, node last) {
+    KvCBasicBlock* pBlock = m_Graph.getBasicBlock(last);
+    bool onTrue = false, onFalse = false;
+    for (edge e : m_View.controlOutEdges(last)) {
+      KvCCfgEdgeInfo* pInfo = m_Graph.inf(e);
+      std::vector<std::string> attributes;
+      if (pInfo->isTrueBranch()) attributes.push_back("label=\"T\""), onTrue = true;
+      if (pInfo->isFalseBranch()) attributes.push_back("label=\"F\""), onFalse = true;
+      if (m_Options.showValues && pBlock && !pInfo->isEdgeExecutable()) attributes.push_back(kNotExecutable);
+      writeEdge(box, idOf(m_Graph.target(e)), attributes);
+    }
+    if (pBlock && pBlock->getBranchCond() && !(onTrue && onFalse)) writeRemovedBranch(box, onTrue ? "F" : "T");
+  }
+
+  void writeRemovedBranch(node box, const char* branch) {
+    std::string colour = m_Options.showValues ? "red" : "gray50";
+    std::string id = "removed" + std::to_string(box.index());
+    m_Out << "    " << id << " [shape=plaintext, label=\"removed\", fontcolor=" << colour << "];\n";
+    writeEdge(box, id, {"label=\"" + std::string(branch) + "\"", "style=dotted, color=" + colour});
+  }
+
+  void writeCallEdges(const std::vector<node>& box) {
+    for (node v : box)
+      for (KvCCfgStatement* pStatement : m_Graph.getBasicBlock(v)->getStatementSeq()) {
+        KvCCfgProcedureCall* pCall = pStatement->isProcedureCall();
+        KvCCfgProcedure* pCallee = pCall ? m_Graph.findProcedure(pCall->getName()) : nullptr;
+        if (pCallee && (m_Options.procedure.empty() || m_Options.procedure == pCallee->getName().cstring()))
+          writeEdge(box.front(), nodeId(pCallee->getEntryNode()), {kCall});
+      }
+  }
+
+  void writeEdge(node from, const std::string& to, const std::vector<std::string>& attributes) {
+    m_Edges << "  " << nodeId(from) << " -> " << to;
+    for (std::size_t i = 0; i < attributes.size(); ++i) m_Edges << (i ? ", " : " [") << attributes[i];
+    m_Edges << (attributes.empty() ? ";\n" : "];\n");
   }
 
   ProgramView m_View;
   const KvCControlFlowGraph& m_Graph;
-  std::vector<std::vector<node>> m_Members;
-  std::vector<node> m_Unclustered;
+  const DotOptions& m_Options;
   std::ostringstream m_Out;
+  std::ostringstream m_Edges;
+  node m_Exit;  // of the procedure being written
+  std::unordered_map<std::uint32_t, node> m_BoxOf;  // by node index: the first block of its box
 };
 
 }  // namespace
 
-std::string writeDot(const Program& program) { return DotWriter(program).write(); }
+std::string writeDot(const Program& program, const DotOptions& options) {
+  return DotWriter(program, options).write();
+}
 
 }  // namespace ssaopt::client

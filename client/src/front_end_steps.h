@@ -1,12 +1,13 @@
-// The steps of the front end, in the order it runs them. Each step throws SourceError at the first
-// error it finds; nothing is put into the graph before every check has passed, except what outlining
-// can only show once it is done.
+// The steps of the front end, in the order it runs them. Each records the errors it finds and goes on
+// with the next declaration or statement; nothing is put into the graph before every check has
+// passed, except what outlining can only show once it is done.
 #pragma once
 
 #include <memory>
 #include <string>
 #include <string_view>
 #include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 #include "ssaopt/client/diagnostics.h"
@@ -16,9 +17,22 @@
 
 namespace ssaopt::client::detail {
 
+// What the checks found so far: the diagnostics, and the names whose declarations had errors. A use
+// of such a name says nothing new, so it is dropped without a message (see FollowUpError).
+struct CheckState {
+  explicit CheckState(DiagnosticList& list) : diagnostics(list) {}
+
+  DiagnosticList& diagnostics;
+  std::unordered_set<std::string_view> failedVariables;
+  std::unordered_set<std::string_view> failedProcedures;
+};
+
+// Thrown at a use of a name whose declaration had an error: the statement goes without a message.
+struct FollowUpError {};
+
 // ---- Declarations (declarations.cpp) -----------------------------------------------------------
 
-void declareVariables(const SyntaxProgram& syntax, Program& program);
+void declareVariables(const SyntaxProgram& syntax, Program& program, CheckState& state);
 
 // Whether `value` can be given to the variable: its data type holds it or, for a scaled variable,
 // holds the stored integer that stands for it.
@@ -31,8 +45,9 @@ struct Signature {
 };
 using Signatures = std::unordered_map<std::string_view, Signature>;
 
-// Checks the procedures' names and formal parameters, and that "#main" exists.
-Signatures declareProcedures(const SyntaxProgram& syntax, Program& program);
+// Checks the procedures' names and formal parameters, and that "#main" exists. A procedure declared
+// twice keeps its first declaration.
+Signatures declareProcedures(const SyntaxProgram& syntax, Program& program, CheckState& state);
 
 // ---- Procedure bodies (resolve.cpp, reachability.cpp) --------------------------------------------
 
@@ -54,13 +69,14 @@ struct ResolvedProcedure {
   std::vector<ResolvedBlock> blocks;  // every block of the text; only the reached ones are built
 };
 
-// Resolves names, checks statements and conditions, and links blocks to their successors.
+// Resolves names, checks statements and conditions, and links blocks to their successors. A
+// statement with an error is left out, a jump to a missing label goes to the end.
 ResolvedProcedure resolveProcedure(const SyntaxProcedure& syntax, const Signatures& signatures,
-                                   Program& program);
+                                   Program& program, CheckState& state);
 
-// Marks the blocks reached from the first; warns about the others, which are not built. Throws when
+// Marks the blocks reached from the first; warns about the others, which are not built. An error when
 // the procedure never reaches its end.
-void markReachedBlocks(ResolvedProcedure& procedure, std::vector<Diagnostic>& warnings);
+void markReachedBlocks(ResolvedProcedure& procedure, DiagnosticList& diagnostics);
 
 // ---- The graph (build_graph.cpp) -----------------------------------------------------------------
 

@@ -144,6 +144,7 @@ std::optional<ListedInputs> ListedInputs::parse(const std::string& text, std::st
     std::istringstream tokens(line.substr(0, line.find('#')));
     std::string name;
     if (!(tokens >> name)) continue;
+    if (!inputs.m_Values.count(name)) inputs.m_Names.push_back(name);
     std::deque<double>& values = inputs.m_Values[name];
     double value = 0.0;
     bool wellFormed = !parseNumber(name, value);

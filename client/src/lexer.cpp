@@ -95,12 +95,20 @@ Lexeme Lexer::lexNumber(SourcePos pos) {
   }
   if (peek() == 'e' || peek() == 'E') {
     std::size_t sign = (peek(1) == '+' || peek(1) == '-') ? 1 : 0;
-    if (!isDigit(peek(1 + sign))) throw SourceError(m_Pos, "malformed number: exponent without digits");
+    if (!isDigit(peek(1 + sign))) {
+      SourcePos exponent = m_Pos;
+      advance(1 + sign);
+      return invalid(LexProblem::ExponentWithoutDigits, exponent, from);
+    }
     advance(1 + sign);
     while (isDigit(peek())) advance();
   }
-  if (isWordChar(peek()))
-    throw SourceError(m_Pos, "malformed number: unexpected '" + std::string(1, peek()) + "'");
+  if (isWordChar(peek())) {
+    SourcePos at = m_Pos;
+    std::size_t fault = m_Offset;
+    while (isWordChar(peek())) advance();
+    return invalid(LexProblem::NumberRunsIntoWord, at, fault);
+  }
   std::string_view text = m_Text.substr(from, m_Offset - from);
   std::string copy(text);
   return Lexeme{Token::Number, text, pos, std::strtod(copy.c_str(), nullptr)};
@@ -114,7 +122,30 @@ Lexeme Lexer::lexPunctuation(SourcePos pos) {
       return Lexeme{punctuation.token, rest.substr(0, punctuation.text.size()), pos, 0.0};
     }
   }
-  throw SourceError(pos, "unexpected character '" + std::string(1, peek()) + "'");
+  // One character: a byte, or a whole UTF-8 sequence, so that a letter such as 'é' is one error.
+  std::size_t from = m_Offset;
+  advance();
+  if (static_cast<unsigned char>(m_Text[from]) >= 0xc0)
+    while (m_Offset - from < 4 && (static_cast<unsigned char>(peek()) & 0xc0) == 0x80) advance();
+  return invalid(LexProblem::UnexpectedCharacter, pos, from);
+}
+
+Lexeme Lexer::invalid(LexProblem problem, SourcePos pos, std::size_t from) {
+  return Lexeme{Token::Invalid, m_Text.substr(from, m_Offset - from), pos, 0.0, problem};
+}
+
+std::string describeProblem(const Lexeme& lexeme) {
+  switch (lexeme.problem) {
+    case LexProblem::UnexpectedCharacter:
+      return "unexpected character '" + escapedText(lexeme.text) + "'";
+    case LexProblem::ExponentWithoutDigits:
+      return "malformed number: exponent without digits";
+    case LexProblem::NumberRunsIntoWord:
+      return "malformed number: unexpected '" + std::string(1, lexeme.text[0]) + "'";
+    case LexProblem::None:
+      break;
+  }
+  return "";
 }
 
 }  // namespace ssaopt::client

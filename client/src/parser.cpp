@@ -52,21 +52,67 @@ SyntaxTerm variableTerm(TermOp op, const Lexeme& name) { return SyntaxTerm{op, n
 
 class Parser {
 public:
-  explicit Parser(std::string_view text) : m_Lexer(text), m_Current(m_Lexer.next()), m_Next(m_Lexer.next()) {}
+  Parser(std::string_view text, DiagnosticList& diagnostics)
+      : m_Diagnostics(diagnostics), m_Lexer(text), m_Current(m_Lexer.next()), m_Next(m_Lexer.next()) {}
 
+  // Every declaration and procedure; after an error, reading goes on at the next statement or
+  // declaration, until the list has too many errors.
   void parseInto(SyntaxProgram& program) {
-    while (!at(Token::EndOfInput)) {
+    try {
+      while (!at(Token::EndOfInput)) parseTopLevelItem(program);
+    } catch (const TooManyErrors&) {
+    }
+    program.endOfInput = m_Current.pos;
+  }
+
+private:
+  // ---- Recovery --------------------------------------------------------------------------------
+
+  void parseTopLevelItem(SyntaxProgram& program) {
+    try {
       if (atWord("var"))
         program.declarations.push_back(parseDeclaration());
       else if (atWord("proc"))
         program.procedures.push_back(parseProcedure());
       else
         fail("expected 'var' or 'proc'");
+    } catch (const SourceError& error) {
+      m_Diagnostics.error(error);
+      skipToDeclaration();
     }
-    program.endOfInput = m_Current.pos;
   }
 
-private:
+  // Up to the next "var" or "proc" outside braces. The error was at a token other than these or after
+  // one of them, so at least one token goes.
+  void skipToDeclaration() {
+    int depth = 0;
+    while (!at(Token::EndOfInput) && !(depth <= 0 && (atWord("var") || atWord("proc")))) {
+      Token token = take().token;
+      depth += token == Token::LeftBrace ? 1 : token == Token::RightBrace ? -1 : 0;
+    }
+  }
+
+  void parseBody(std::vector<SyntaxBlock>& blocks) {
+    while (!at(Token::RightBrace)) {
+      if (at(Token::EndOfInput) || atWord("var") || atWord("proc")) fail("expected '}'");
+      std::uint64_t takenBefore = m_Taken;
+      try {
+        parseItem(blocks);
+      } catch (const SourceError& error) {
+        m_Diagnostics.error(error);
+        skipToStatement();
+        if (m_Taken == takenBefore) take();
+      }
+    }
+  }
+
+  // Past the next ';', or up to what starts a block or ends the procedure.
+  void skipToStatement() {
+    while (!at(Token::EndOfInput) && !at(Token::RightBrace) && !atLabel() && !atWord("outline") &&
+           !atWord("var") && !atWord("proc"))
+      if (take().token == Token::Semicolon) return;
+  }
+
   // ---- Tokens ----------------------------------------------------------------------------------
 
   bool at(Token token) const { return m_Current.token == token; }
@@ -77,10 +123,13 @@ private:
     Lexeme taken = m_Current;
     m_Current = m_Next;
     if (!at(Token::EndOfInput)) m_Next = m_Lexer.next();
+    ++m_Taken;
     return taken;
   }
 
+  // At an Invalid lexeme, what is wrong with it; otherwise what was expected and what was found.
   [[noreturn]] void fail(const std::string& expected) const {
+    if (at(Token::Invalid)) throw SourceError(m_Current.pos, describeProblem(m_Current));
     std::string found = at(Token::EndOfInput) ? "the end of the input" : quoted(m_Current.text);
     throw SourceError(m_Current.pos, expected + ", found " + found);
   }
@@ -220,7 +269,7 @@ private:
     procedure.name = expectProcedureName();
     if (at(Token::LeftParen)) procedure.formals = parseNameList("a formal parameter");
     expect(Token::LeftBrace, "{");
-    while (!at(Token::RightBrace)) parseItem(procedure.blocks);
+    parseBody(procedure.blocks);
     take();
     if (procedure.blocks.empty()) procedure.blocks.emplace_back();
     return procedure;
@@ -242,7 +291,6 @@ private:
   }
 
   void parseItem(std::vector<SyntaxBlock>& blocks) {
-    if (at(Token::EndOfInput)) fail("expected '}'");
     if (atWord("outline") || atLabel()) {
       blocks.push_back(parseBlockHeader());
       return;
@@ -438,9 +486,11 @@ private:
     terms.push_back(variableTerm(TermOp::ElementRead, name));
   }
 
+  DiagnosticList& m_Diagnostics;
   Lexer m_Lexer;
   Lexeme m_Current;
   Lexeme m_Next;
+  std::uint64_t m_Taken = 0;  // lexemes taken so far, to see whether recovery moved on
   int m_Depth = 0;
 };
 
@@ -452,10 +502,10 @@ bool isReservedWord(std::string_view word) {
   return false;
 }
 
-SyntaxProgram parseProgram(std::string text) {
+SyntaxProgram parseProgram(std::string text, DiagnosticList& diagnostics) {
   SyntaxProgram program;
   program.text = std::make_unique<const std::string>(std::move(text));
-  Parser(*program.text).parseInto(program);
+  Parser(*program.text, diagnostics).parseInto(program);
   return program;
 }
 

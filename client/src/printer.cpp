@@ -42,9 +42,14 @@ public:
   Printer(const Program& program, const PrintOptions& options) : m_View(program), m_Options(options) {}
 
   std::string print() {
-    for (const auto& pVariable : m_View.program().variables()) m_Out << declarationText(*pVariable) << "\n";
-    for (const ProcedureView& procedure : m_View.procedures()) printProcedure(procedure);
-    return m_Out.str();
+    bool whole = m_Options.procedure.empty();
+    if (whole)
+      for (const auto& pVariable : m_View.program().variables()) m_Out << declarationText(*pVariable) << "\n";
+    for (const ProcedureView& procedure : m_View.procedures())
+      if (whole || procedure.name == m_Options.procedure) printProcedure(procedure);
+    // A procedure alone goes without the empty line that separates it from what comes before.
+    std::string text = m_Out.str();
+    return whole || text.empty() ? text : text.substr(1);
   }
 
 private:

@@ -58,6 +58,9 @@ public:
   std::vector<ssaopt::edge> controlOutEdges(ssaopt::node v) const;
   std::vector<ssaopt::edge> controlInEdges(ssaopt::node v) const;
   bool hasOneControlInEdge(ssaopt::node v) const;
+  // The block that `v` falls into and that nothing else enters, or nil: blocks printed one after the
+  // other as one piece of straight-line code.
+  ssaopt::node continuationOf(ssaopt::node v) const;
 
 private:
   void findHiddenBlocks();
@@ -65,7 +68,6 @@ private:
   bool onlyLeadsToTheEnd(ssaopt::node v) const;
   void layOutProcedures();
   void layOut(ProcedureView& procedure, const std::vector<ssaopt::node>& nodes);
-  ssaopt::node continuationOf(ssaopt::node v) const;
   bool isShownBlock(ssaopt::node v) const;
   void findNamedBlocksAndCalls();
   void assignLabels(const ProcedureView& procedure);

@@ -7,7 +7,7 @@
 
 namespace ssaopt::client::detail {
 
-void markReachedBlocks(ResolvedProcedure& procedure, std::vector<Diagnostic>& warnings) {
+void markReachedBlocks(ResolvedProcedure& procedure, DiagnosticList& diagnostics) {
   std::vector<int> work{0};
   procedure.blocks[0].reached = true;
   bool reachesEnd = false;
@@ -29,14 +29,13 @@ void markReachedBlocks(ResolvedProcedure& procedure, std::vector<Diagnostic>& wa
   }
   const SyntaxName& name = procedure.pSyntax->name;
   if (!reachesEnd)
-    throw SourceError(name.pos, "procedure '" + std::string(name.text) + "' never reaches its end");
+    diagnostics.error(name.pos, "procedure '" + std::string(name.text) + "' never reaches its end");
   // Only the first block can be without a label, and it is always reached.
   for (const ResolvedBlock& block : procedure.blocks)
     if (!block.reached)
-      warnings.push_back(Diagnostic{Severity::Warning, block.pSyntax->label.pos,
-                                    "block '" + std::string(block.pSyntax->label.text) +
-                                        "' cannot be reached from the start of '" + std::string(name.text) +
-                                        "' and is dropped"});
+      diagnostics.warning(block.pSyntax->label.pos, "block '" + std::string(block.pSyntax->label.text) +
+                                                        "' cannot be reached from the start of '" +
+                                                        std::string(name.text) + "' and is dropped");
 }
 
 }  // namespace ssaopt::client::detail

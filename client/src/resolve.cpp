@@ -17,8 +17,8 @@ std::string quoted(std::string_view text) { return "'" + std::string(text) + "'"
 
 class BodyResolver {
 public:
-  BodyResolver(const Signatures& signatures, Program& program)
-      : m_Signatures(signatures), m_Program(program) {}
+  BodyResolver(const Signatures& signatures, Program& program, CheckState& state)
+      : m_Signatures(signatures), m_Program(program), m_State(state) {}
 
   ResolvedProcedure resolve(const SyntaxProcedure& syntax) {
     ResolvedProcedure procedure;
@@ -40,9 +40,8 @@ private:
       if (label.text.empty()) continue;
       auto inserted = m_Labels.emplace(label.text, static_cast<int>(i));
       if (!inserted.second)
-        throw SourceError(label.pos,
-                          "label " + quoted(label.text) + " is already used at line " +
-                              std::to_string(syntax.blocks[inserted.first->second].label.pos.line));
+        m_State.diagnostics.error(label.pos, "label " + quoted(label.text) + " is already used at line " +
+                                                 std::to_string(syntax.blocks[inserted.first->second].label.pos.line));
     }
   }
 
@@ -50,20 +49,31 @@ private:
     const SyntaxBlock& written = syntax.blocks[i];
     block.pSyntax = &written;
     for (const SyntaxStatement& statement : written.statements)
-      block.statements.push_back(resolveStatement(statement));
+      recovering([&] { block.statements.push_back(resolveStatement(statement)); });
     const SyntaxTerminator& terminator = written.terminator;
     switch (terminator.kind) {
       case SyntaxTerminator::Kind::FallThrough:
         block.onTrue = i + 1 < syntax.blocks.size() ? static_cast<int>(i + 1) : kEnd;
         break;
       case SyntaxTerminator::Kind::Goto:
-        block.onTrue = blockOf(terminator.onTrue, syntax);
+        recovering([&] { block.onTrue = blockOf(terminator.onTrue, syntax); });
         break;
       case SyntaxTerminator::Kind::Branch:
-        block.pCondition = resolveExpression(terminator.condition);
-        block.onTrue = blockOf(terminator.onTrue, syntax);
-        block.onFalse = blockOf(terminator.onFalse, syntax);
+        recovering([&] { block.pCondition = resolveExpression(terminator.condition); });
+        recovering([&] { block.onTrue = blockOf(terminator.onTrue, syntax); });
+        recovering([&] { block.onFalse = blockOf(terminator.onFalse, syntax); });
         break;
+    }
+  }
+
+  // Runs one check, recording its error; what the check would have set keeps its default.
+  template <typename Check>
+  void recovering(const Check& check) {
+    try {
+      check();
+    } catch (const SourceError& error) {
+      m_State.diagnostics.error(error);
+    } catch (const FollowUpError&) {
     }
   }
 
@@ -202,6 +212,7 @@ private:
 
   KvCCfgSFVariable* variableNamed(const SyntaxName& name) const {
     KvCCfgSFVariable* pVariable = m_Program.findVariable(name.text);
+    if (!pVariable && m_State.failedVariables.count(name.text)) throw FollowUpError();
     if (!pVariable) throw SourceError(name.pos, "unknown variable " + quoted(name.text));
     return pVariable;
   }
@@ -209,6 +220,7 @@ private:
   const Signature& signatureOf(const SyntaxName& name) const {
     auto found = m_Signatures.find(name.text);
     if (found == m_Signatures.end()) throw SourceError(name.pos, "unknown procedure " + quoted(name.text));
+    if (m_State.failedProcedures.count(name.text)) throw FollowUpError();
     if (name.text == KvCControlFlowGraph::kMainProcedureName)
       throw SourceError(name.pos, "'#main' cannot be called: it is where the program starts");
     return found->second;
@@ -241,14 +253,15 @@ private:
 
   const Signatures& m_Signatures;
   Program& m_Program;
+  CheckState& m_State;
   std::unordered_map<std::string_view, int> m_Labels;
 };
 
 }  // namespace
 
 ResolvedProcedure resolveProcedure(const SyntaxProcedure& syntax, const Signatures& signatures,
-                                   Program& program) {
-  return BodyResolver(signatures, program).resolve(syntax);
+                                   Program& program, CheckState& state) {
+  return BodyResolver(signatures, program, state).resolve(syntax);
 }
 
 }  // namespace ssaopt::client::detail

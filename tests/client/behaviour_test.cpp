@@ -1,7 +1,8 @@
 // The differential check: where two traces part, that the check finds a transformation that changes
 // what a program does (made by hand here, since the library's are meant to be right), that a run the
 // transformed program stopped at a guard counts for nothing, and that the library's pipelines keep
-// the behaviour of the examples at every stage.
+// the behaviour of the examples at every stage. Regressions of single programs are in
+// tests/filetests/behaviour.
 #include "behaviour.h"
 
 #include <cmath>
@@ -160,112 +161,6 @@ TEST(Behaviour, EveryExampleBehavesTheSameAfterEachStageOfThePipeline) {
     for (const std::vector<std::string>& pipeline : pipelines())
       EXPECT_TRUE(behaviourtest::sameBehaviour(clienttest::readExample(example), pipeline))
           << example << " after " << ssaopt::tool::joinedPassNames(pipeline);
-}
-
-// The summaries pass v to the callee through a parameter statement; reading v there would take an
-// input the program never reads.
-TEST(Behaviour, AParameterStatementThatPassesAVolatileToItselfReadsNoInput) {
-  EXPECT_TRUE(
-      behaviourtest::sameBehaviour("var int16 v volatile;\n"
-                                   "var int16 x output = 0;\n"
-                                   "proc #main {\n"
-                                   "  call take();\n"
-                                   "  call take();\n"
-                                   "}\n"
-                                   "proc take {\n"
-                                   "  x = x + v;\n"
-                                   "}\n",
-                                   {"ssa"}));
-}
-
-// Virtual assignments record what a condition implies and generate no code: b, volatile, keeps the
-// value the program stored (none, so its initial 0) whatever its reads gave.
-TEST(Behaviour, VirtualAssignmentsRunAsNothing) {
-  EXPECT_TRUE(
-      behaviourtest::sameBehaviour("var bool b volatile;\n"
-                                   "var int16 y output = 0;\n"
-                                   "proc #main {\n"
-                                   "  if b goto yes else no;\n"
-                                   "yes:\n"
-                                   "  y = y + 1;\n"
-                                   "no:\n"
-                                   "  extern show uses(b);\n"
-                                   "}\n",
-                                   {"valid-conditions", "ssa", "divide"}));
-}
-
-// The parameter statement of an unused formal was removed although its argument reads a volatile
-// input: the program then read one input fewer per call, and later reads saw other values.
-TEST(Behaviour, RegressionAParameterWhoseArgumentReadsAnInputStays) {
-  EXPECT_TRUE(
-      behaviourtest::sameBehaviour("var int16 v volatile;\n"
-                                   "var int16 p erasable = 0;\n"
-                                   "var int16 x = 0;\n"
-                                   "proc #main {\n"
-                                   "  call f(v);\n"
-                                   "  call f(v);\n"
-                                   "  x = v;\n"
-                                   "  extern show uses(x);\n"
-                                   "}\n"
-                                   "proc f(p) {\n"
-                                   "}\n",
-                                   {"ssa", "divide", "remove-unused"}));
-}
-
-// A volatile Boolean compared with a constant outside 0 and 1 has a fixed outcome, but replacing the
-// condition by it dropped the read of the input: every later read saw another value.
-TEST(Behaviour, RegressionAFixedComparisonOfAnInputKeepsItsRead) {
-  EXPECT_TRUE(
-      behaviourtest::sameBehaviour("var bool in0 volatile;\n"
-                                   "var bool seen output = 0;\n"
-                                   "proc #main {\n"
-                                   "  if in0 != 5 goto yes else no;\n"
-                                   "yes:\n"
-                                   "  seen = in0;\n"
-                                   "no:\n"
-                                   "}\n",
-                                   {"valid-conditions"}));
-}
-
-// Storing -1 in an unsigned variable saturated at 20 leaves 4294967295 (the clamp comes before the
-// cast); the phi function joining two such stores adjusted the value again and clamped it to 20.
-TEST(Behaviour, RegressionAPhiFunctionDoesNotSaturateWhatItsOperandsHold) {
-  EXPECT_TRUE(
-      behaviourtest::sameBehaviour("var bool one = 0;\n"
-                                   "var bool in0 volatile;\n"
-                                   "var uint32 u saturate(..20) = 0;\n"
-                                   "var float32 y output = 0;\n"
-                                   "proc #main {\n"
-                                   "  one = 1;\n"
-                                   "  if in0 goto a else b;\n"
-                                   "a:\n"
-                                   "  u = -one;\n"
-                                   "  goto j;\n"
-                                   "b:\n"
-                                   "  u = -one;\n"
-                                   "j:\n"
-                                   "  y = u;\n"
-                                   "}\n",
-                                   {"ssa", "divide", "sccp", "replace-constants"}));
-}
-
-// The same through a value-return statement: what a procedure stored comes back to its caller as it
-// was, not saturated again.
-TEST(Behaviour, RegressionAReturnedValueIsNotSaturatedAgain) {
-  EXPECT_TRUE(
-      behaviourtest::sameBehaviour("var bool one = 0;\n"
-                                   "var uint32 u saturate(..20) = 0;\n"
-                                   "var float32 y output = 0;\n"
-                                   "proc #main {\n"
-                                   "  call set();\n"
-                                   "  call set();\n"
-                                   "  y = u;\n"
-                                   "}\n"
-                                   "proc set {\n"
-                                   "  one = 1;\n"
-                                   "  u = -one;\n"
-                                   "}\n",
-                                   {"ssa", "divide", "sccp", "replace-constants"}));
 }
 
 }  // namespace

@@ -1,4 +1,4 @@
-// Coverage-guided fuzzing of the front end: every input must give a program or an error with a
+// Coverage-guided fuzzing of the front end: every input must give a program or errors, each with a
 // position inside the text, and a program must print as text that reads back as the same program.
 // Crashes, hangs, leaks and sanitizer reports are findings too. As in the tool, the pool memory
 // controller takes back what the graph never deletes, so a leak report is about the client's own
@@ -26,13 +26,15 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   ssaopt::PoolMemController::Scope scope(&pool);
   std::string text(reinterpret_cast<const char*>(data), size);
   ssaopt::client::LoadResult loaded = ssaopt::client::loadProgram(text);
-  if (!loaded.program) {
-    if (loaded.diagnostics.empty()) __builtin_trap();
-    const ssaopt::client::Diagnostic& error = loaded.diagnostics.back();
-    if (error.severity != ssaopt::client::Severity::Error || !positionInside(error.pos, text))
-      __builtin_trap();
-    return 0;
+  bool hasError = false;
+  for (const ssaopt::client::Diagnostic& diagnostic : loaded.diagnostics) {
+    hasError = hasError || diagnostic.severity == ssaopt::client::Severity::Error;
+    if (!positionInside(diagnostic.pos, text)) __builtin_trap();
+    // Showing the message with its line and caret runs under the sanitizers too.
+    static_cast<void>(ssaopt::client::formatDiagnostic("fuzz.ssa", diagnostic));
   }
+  if (hasError == (loaded.program != nullptr)) __builtin_trap();
+  if (!loaded.program) return 0;
   std::string printed = ssaopt::client::printProgram(*loaded.program);
   ssaopt::client::LoadResult reloaded = ssaopt::client::loadProgram(printed);
   if (!reloaded.program || ssaopt::client::printProgram(*reloaded.program) != printed) __builtin_trap();

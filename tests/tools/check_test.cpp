@@ -83,12 +83,31 @@ TEST(ToolRun, MalformedInputValuesAreAnError) {
   EXPECT_EQ(malformed.out, "");
 }
 
+TEST(ToolRun, InputValuesForWhatIsNotAnInputAreAnError) {
+  std::string misspelt = fileWith("misspelt", "tabel 1 2\n");
+  Result unknown = ssaopt("run " + example("loop") + " --inputs " + misspelt);
+  EXPECT_EQ(unknown.status, 1);
+  EXPECT_EQ(unknown.err, "ssaopt: " + misspelt + ": 'tabel' is not a variable of the program\n");
+  EXPECT_EQ(unknown.out, "");
+  std::string notInput = fileWith("total", "total 1 2\n");
+  EXPECT_EQ(ssaopt("run " + example("loop") + " --inputs " + notInput).err,
+            "ssaopt: " + notInput + ": 'total' is not an input of the program (neither volatile nor an array)\n");
+}
+
+TEST(ToolRun, InputValuesComeFromStandardInputToo) {
+  std::string values = fileWith("values", "level 150 3\n");
+  Result fromFile = ssaopt("run " + example("outline") + " --steps 2 --inputs " + values);
+  Result fromInput = ssaopt("run " + example("outline") + " --steps 2 --inputs - <" + values);
+  EXPECT_EQ(fromInput.status, 0) << fromInput.err;
+  EXPECT_EQ(fromInput.out, fromFile.out);
+}
+
 TEST(ToolRun, AProgramWithErrorsIsReportedAsByTheTransformingTool) {
   std::string path = fileWith("error.ssa", "var int16 x;\nproc #main {\n  x = y;\n}\n");
   for (const char* command : {"run ", "check "}) {
     Result result = ssaopt(command + path);
     EXPECT_EQ(result.status, 1) << command;
-    EXPECT_EQ(result.err, path + ":3:7: error: unknown variable 'y'\n") << command;
+    EXPECT_EQ(result.err, path + ":3:7: error: unknown variable 'y'\n  x = y;\n      ^\n") << command;
   }
 }
 
@@ -98,10 +117,10 @@ TEST(ToolBehaviourUsage, OptionsOfTheCommandsBelongToThem) {
     const char* error;
   };
   const Case kCases[] = {
-      {"x.ssa --steps 3", "--steps, --runs, --seed and --inputs belong to the run and check commands"},
-      {"run x.ssa --runs 3", "--runs belongs to the check command"},
-      {"check x.ssa --inputs v.txt", "--inputs belongs to the run command"},
-      {"check x.ssa --steps 0", "--steps and --runs need at least 1"},
+      {"x.ssa --steps 3", "--steps is an option of run, check, cc-check and reduce, not of the main command"},
+      {"run x.ssa --runs 3", "--runs is an option of check, cc-check and reduce, not of run"},
+      {"check x.ssa --inputs v.txt", "--inputs is an option of run, not of check"},
+      {"check x.ssa --steps 0", "--steps needs at least 1"},
       {"check x.ssa --seed abc", "--seed needs a whole number, not 'abc'"},
       {"run x.ssa --steps", "--steps needs a value"},
       {"check", "no input file"},

@@ -3,8 +3,10 @@
 
 #include <gtest/gtest.h>
 #include <sys/wait.h>
+#include <unistd.h>
 
 #include <cstdlib>
+#include <filesystem>
 #include <fstream>
 #include <sstream>
 #include <string>
@@ -17,10 +19,27 @@ struct Result {
   std::string err;
 };
 
-// A path of the running test's own, so that tests may run in parallel.
+// The directory of this test process's files, removed when the process ends; of its own, so that tests
+// may run in parallel, also with the tests of another build on the machine.
+inline const std::string& testDirectory() {
+  struct Directory {
+    Directory() : path(::testing::TempDir() + "ssaopt-tests-" + std::to_string(getpid())) {
+      std::filesystem::create_directories(path);
+    }
+    ~Directory() {
+      std::error_code ignored;
+      std::filesystem::remove_all(path, ignored);
+    }
+    std::string path;
+  };
+  static const Directory directory;
+  return directory.path;
+}
+
+// A path of the running test's own.
 inline std::string pathOf(const std::string& name) {
   const ::testing::TestInfo* pTest = ::testing::UnitTest::GetInstance()->current_test_info();
-  return ::testing::TempDir() + "ssaopt_" + pTest->test_suite_name() + "_" + pTest->name() + "_" + name;
+  return testDirectory() + "/" + pTest->test_suite_name() + "_" + pTest->name() + "_" + name;
 }
 
 inline std::string contentsOf(const std::string& path) {
@@ -35,9 +54,10 @@ inline std::string fileWith(const std::string& name, const std::string& text) {
   return pathOf(name);
 }
 
-inline Result ssaopt(const std::string& arguments) {
-  std::string command =
-      std::string(SSAOPT_TOOL) + " " + arguments + " >'" + pathOf("out") + "' 2>'" + pathOf("err") + "'";
+// Runs the tool with `arguments`, and with `environment` ("NAME=value ...") set for it.
+inline Result ssaopt(const std::string& arguments, const std::string& environment = "") {
+  std::string command = (environment.empty() ? "" : environment + " ") + std::string(SSAOPT_TOOL) + " " +
+                        arguments + " >'" + pathOf("out") + "' 2>'" + pathOf("err") + "'";
   int status = std::system(command.c_str());
   return Result{WIFEXITED(status) ? WEXITSTATUS(status) : -1, contentsOf(pathOf("out")),
                 contentsOf(pathOf("err"))};

@@ -23,6 +23,7 @@
 #pragma once
 
 #include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -32,14 +33,20 @@
 namespace ssaopt::client {
 
 struct LoadResult {
-  std::unique_ptr<Program> program;  // null after an error
-  // The warnings, and the error that stopped the front end, in the order found.
+  std::unique_ptr<Program> program;  // null when there are errors
+  // Errors and warnings in the order of their positions, with their source lines. The front end goes
+  // on after an error at the next statement or declaration (after a syntax error it only reads on),
+  // up to DiagnosticList::kMaxErrors errors.
   std::vector<Diagnostic> diagnostics;
 };
 
 LoadResult loadProgram(std::string text);
 
-// Reads the file first; an unreadable file is an error at line 0.
+// The text of the file at `path`, or nothing when it cannot be read. "-" is standard input, read at
+// the first call; later calls give the same text, so a command may load the program twice.
+std::optional<std::string> readSourceText(const std::string& path);
+
+// Reads the file first (see readSourceText); an unreadable file is an error at line 0.
 LoadResult loadProgramFile(const std::string& path);
 
 // Starts the numbering of the library's objects again from 0, so that the program loaded next has the

@@ -88,8 +88,12 @@ public:
   static std::optional<ListedInputs> parse(const std::string& text, std::string& error);
   std::optional<double> next(const KvCCfgSFVariable& variable) override;
 
+  // The names the text gives values for, in the order they first appear.
+  const std::vector<std::string>& variableNames() const { return m_Names; }
+
 private:
   std::unordered_map<std::string, std::deque<double>> m_Values;
+  std::vector<std::string> m_Names;
 };
 
 // ---- The trace ----------------------------------------------------------------------------------

@@ -27,8 +27,9 @@ namespace ssaopt::client {
 // code never comes near it, and it keeps the reading recursion far from the stack's limit.
 inline constexpr int kMaxExpressionNesting = 1000;
 
-// Throws SourceError at the first error.
-SyntaxProgram parseProgram(std::string text);
+// Records every syntax error in `diagnostics`, going on after each at the next statement or
+// declaration, and stops when the list has too many. The tree is complete when no error was recorded.
+SyntaxProgram parseProgram(std::string text, DiagnosticList& diagnostics);
 
 // Words that name no variable, label or procedure.
 bool isReservedWord(std::string_view word);

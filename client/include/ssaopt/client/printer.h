@@ -14,6 +14,9 @@ struct PrintOptions {
   // After each definition, the variable's propagated value and range ("// 4 in [4, 8]"); after each
   // branch, which of its out-edges are executable.
   bool showValues = false;
+  // When not empty, only the procedure of this name, without the declarations (nothing when the
+  // program has no such procedure).
+  std::string procedure = {};
 };
 
 std::string printProgram(const Program& program, const PrintOptions& options = {});
