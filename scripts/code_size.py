@@ -382,6 +382,10 @@ def main():
     if not options.compilers:
         print("code-size: none of the C compilers is installed; nothing measured")
         sys.exit(SKIPPED)
+    missing = [tool for tool in ("size", "objdump") if not shutil.which(tool)]
+    if missing:
+        print(f"code-size: {' and '.join(missing)} (binutils) not installed; nothing measured")
+        sys.exit(SKIPPED)
     if options.shapes and not os.access(options.make_program, os.X_OK):
         sys.exit(f"code-size: no {options.make_program} (configure with benchmarks, or --shapes without sizes)")
 
