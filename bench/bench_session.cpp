@@ -5,8 +5,8 @@
 #include <map>
 #include <utility>
 
-#include "passes.h"
 #include "ssaopt/client/front_end.h"
+#include "ssaopt/client/pipeline.h"
 
 namespace ssaopt::bench {
 
@@ -34,10 +34,12 @@ void Session::load(const std::string& text) {
 }
 
 void Session::runPipelineUpTo(const std::string& name) {
-  for (const std::string& step : tool::defaultPipeline()) {
-    if (step == name) return;
-    tool::findPass(step)->run(*m_pProgram);
+  Pipeline before;
+  for (const PipelineStep* pStep : typicalRun()) {
+    if (pStep->name == name) break;
+    before.push_back(pStep);
   }
+  client::runPipeline(*m_pProgram, before);
 }
 
 }  // namespace ssaopt::bench

@@ -35,7 +35,7 @@ public:
 
   // Builds the graph of `text` through the client's front end; aborts if the front end rejects it.
   void load(const std::string& text);
-  // Runs the steps of the default pipeline that come before step `name`.
+  // Runs the steps of the library's typical run that come before step `name`.
   void runPipelineUpTo(const std::string& name);
 
   client::Program& program() { return *m_pProgram; }

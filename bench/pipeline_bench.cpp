@@ -1,11 +1,11 @@
-// Building the graph through the client, and the default pipeline with the time of each step.
+// Building the graph through the client, and the library's typical run with the time of each step.
 #include <benchmark/benchmark.h>
 
 #include <map>
 #include <string>
 
 #include "bench_session.h"
-#include "passes.h"
+#include "ssaopt/client/pipeline.h"
 
 namespace ssaopt::bench {
 
@@ -34,6 +34,26 @@ void buildGraph(benchmark::State& state, Shape shape, std::size_t statements) {
   setPerStatement(state, "peak_bytes_per_stmt", peakBytes, statements);
 }
 
+// The client's part in every step, timed with the library's.
+class TimedSteps : public client::ProgramSteps {
+public:
+  TimedSteps(client::Program& program, std::map<std::string, double>& stepNanoseconds)
+      : client::ProgramSteps(program), m_StepNanoseconds(stepNanoseconds) {}
+
+  void runStep(const PipelineStep& step, KvCControlFlowGraph& graph) override {
+    double start = threadSeconds();
+    client::ProgramSteps::runStep(step, graph);
+    double stepSeconds = threadSeconds() - start;
+    m_StepNanoseconds[step.name] += stepSeconds * kNanoseconds;
+    m_Seconds += stepSeconds;
+  }
+  double seconds() const { return m_Seconds; }
+
+private:
+  std::map<std::string, double>& m_StepNanoseconds;
+  double m_Seconds = 0;
+};
+
 // Counters: ns_per_stmt for the whole pipeline and STEP_ns_per_stmt for each step, and the peak of
 // building and running the pipeline together, peak_bytes_per_stmt.
 void runPipeline(benchmark::State& state, Shape shape, std::size_t statements) {
@@ -43,14 +63,9 @@ void runPipeline(benchmark::State& state, Shape shape, std::size_t statements) {
   for (auto _ : state) {
     Session session;
     session.load(text);
-    double seconds = 0;
-    for (const std::string& step : tool::defaultPipeline()) {
-      double start = threadSeconds();
-      tool::findPass(step)->run(session.program());
-      double stepSeconds = threadSeconds() - start;
-      stepNanoseconds[step] += stepSeconds * kNanoseconds;
-      seconds += stepSeconds;
-    }
+    TimedSteps steps(session.program(), stepNanoseconds);
+    runTypicalRun(session.program().graph(), steps);
+    double seconds = steps.seconds();
     state.SetIterationTime(seconds);
     nanoseconds += seconds * kNanoseconds;
     peakBytes += static_cast<double>(session.peakBytes());

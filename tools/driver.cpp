@@ -14,6 +14,7 @@
 #include "ssaopt/client/c_emitter.h"
 #include "ssaopt/client/dot.h"
 #include "ssaopt/client/front_end.h"
+#include "ssaopt/client/pipeline.h"
 #include "ssaopt/client/printer.h"
 #include "ssaopt/frame/control.h"
 #include "ssaopt/frame/pool.h"
@@ -25,6 +26,19 @@ namespace ssaopt::tool {
 namespace {
 
 using Clock = std::chrono::steady_clock;
+
+class Run;
+
+// The client's part in every step, then what the options ask for after it: counts, times, the program
+// printed, the graph verified.
+class ObservedSteps : public client::ProgramSteps {
+public:
+  ObservedSteps(client::Program& program, Run& run) : client::ProgramSteps(program), m_Run(run) {}
+  void runStep(const ssaopt::PipelineStep& step, KvCControlFlowGraph& graph) override;
+
+private:
+  Run& m_Run;
+};
 
 class Run {
 public:
@@ -41,7 +55,8 @@ public:
     if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), "the front end");
     GraphCounts before = m_Counting ? countGraph(m_pProgram->graph()) : GraphCounts();
     if (m_Report) m_Report->addStep("the front end", *m_pProgram, 0.0);
-    for (const std::string& name : pipeline) runPass(*findPass(name));
+    ObservedSteps steps(*m_pProgram, *this);
+    ssaopt::runPipeline(m_pProgram->graph(), client::pipelineNamed(pipeline), steps);
     writeNotices();
     std::string statistics = m_Counting ? statisticsText(before) : "", times = timesText();
     bool written = writeResult(statistics, times);
@@ -71,18 +86,21 @@ private:
     return false;
   }
 
-  void runPass(const Pass& pass) {
+  // Runs `runClientStep` (the client's part and the library's step) and observes it.
+  template <class RunStep>
+  void observeStep(const ssaopt::PipelineStep& step, RunStep runClientStep) {
     GraphCounts ahead = m_Counting ? countGraph(m_pProgram->graph()) : GraphCounts();
-    m_Printer.beforePass(pass.name, *m_pProgram);
+    m_Printer.beforePass(step.name, *m_pProgram);
     Clock::time_point start = Clock::now();
-    pass.run(*m_pProgram);
+    runClientStep();
     double milliseconds = std::chrono::duration<double, std::milli>(Clock::now() - start).count();
-    m_Times.emplace_back(pass.name, milliseconds);
+    m_Times.emplace_back(step.name, milliseconds);
     if (m_Counting) m_Removed.add(ahead, countGraph(m_pProgram->graph()));
-    m_Printer.afterPass(pass.name, *m_pProgram);
-    if (m_Report) m_Report->addStep(pass.name, *m_pProgram, milliseconds);
-    if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), std::string("pass ") + pass.name);
+    m_Printer.afterPass(step.name, *m_pProgram);
+    if (m_Report) m_Report->addStep(step.name, *m_pProgram, milliseconds);
+    if (m_Verification) m_Verification->checkGraph(m_pProgram->graph(), std::string("pass ") + step.name);
   }
+  friend class ObservedSteps;
 
   // What the client's expressions noticed while the passes ran, shown at their place in the source.
   void writeNotices() {
@@ -165,6 +183,10 @@ private:
   std::vector<std::pair<std::string, double>> m_Times;
   RemovedCounts m_Removed;
 };
+
+void ObservedSteps::runStep(const ssaopt::PipelineStep& step, KvCControlFlowGraph& graph) {
+  m_Run.observeStep(step, [&] { client::ProgramSteps::runStep(step, graph); });
+}
 
 }  // namespace
 

@@ -26,6 +26,9 @@ namespace {
 constexpr std::chrono::seconds kProgressInterval(1);
 // Every this many programs, another process optimises the program too and must print the same.
 constexpr std::uint64_t kDeterminismInterval = 10;
+// A random pipeline has at most this many passes: enough to reach propagation after SSA and dividing
+// most of the time, and to repeat steps after it.
+constexpr std::size_t kMaxRandomPasses = 16;
 
 using Clock = std::chrono::steady_clock;
 
@@ -65,7 +68,7 @@ public:
         m_Err(err),
         m_FirstSeed(options.seed.value_or(kDefaultSeed)),
         m_Size(options.size.value_or(client::kDefaultProgramSize)),
-        m_Check(options.passes.value_or(defaultPipeline()), ownExecutable()) {}
+        m_Tool(ownExecutable()) {}
 
   int execute() {
     if (m_Options.command == Command::Generate) {
@@ -94,31 +97,39 @@ private:
   }
 
   void checkProgram(std::uint64_t seed) {
-    prepareCrashMessage(seed);
+    ProgramCheck check(pipelineFor(seed), m_Tool);
+    prepareCrashMessage(seed, check);
     std::string text = client::generateProgram(seed, m_Size);
     bool checkDeterminism = seed % kDeterminismInterval == 0;
-    Problem problem = m_Check.findProblem(text, checkDeterminism);
+    Problem problem = check.findProblem(text, checkDeterminism);
     if (!problem) return;
     ++m_Failures;
-    m_Err << "failure in the program of seed " << seed << ":\n" << problem.detail;
+    m_Err << "failure in the program of seed " << seed << check.passesOption() << ":\n" << problem.detail;
     std::string path = "fuzz-" + std::to_string(seed) + ".ssa";
-    writeProgram(path, text, problem.kind);
+    writeProgram(path, text, problem.kind, check);
     if (problem.kind == ProblemKind::Invalid) return;
     std::string shrunk = shrinkProgram(text, [&](const std::string& candidate) {
-      return m_Check.findProblem(candidate, checkDeterminism).kind == problem.kind;
+      return check.findProblem(candidate, checkDeterminism).kind == problem.kind;
     });
-    writeProgram("fuzz-" + std::to_string(seed) + "-shrunk.ssa", shrunk, problem.kind);
+    writeProgram("fuzz-" + std::to_string(seed) + "-shrunk.ssa", shrunk, problem.kind, check);
   }
 
-  void writeProgram(const std::string& path, const std::string& text, ProblemKind kind) {
+  // The pipeline of --passes, a random one drawn from the program's seed, or the default one. The
+  // random one depends on the seed alone, so a failure reproduces with the same seed.
+  std::vector<std::string> pipelineFor(std::uint64_t seed) const {
+    if (m_Options.randomPasses) return randomLegalPipeline(seed, kMaxRandomPasses);
+    return m_Options.passes.value_or(defaultPipeline());
+  }
+
+  void writeProgram(const std::string& path, const std::string& text, ProblemKind kind, const ProgramCheck& check) {
     std::ofstream(path, std::ios::binary) << text;
-    m_Err << "  wrote " << path << "; reproduce: " << m_Check.reproduceCommand(kind, path) << "\n";
+    m_Err << "  wrote " << path << "; reproduce: " << check.reproduceCommand(kind, path) << "\n";
   }
 
-  void prepareCrashMessage(std::uint64_t seed) {
+  void prepareCrashMessage(std::uint64_t seed, const ProgramCheck& check) {
     std::string message = "ssaopt: fuzz: crashed on the program of seed " + std::to_string(seed) +
                           "; reproduce: ssaopt fuzz --programs 1 --seed " + std::to_string(seed) +
-                          " --size " + std::to_string(m_Size) + m_Check.passesOption() + "\n";
+                          " --size " + std::to_string(m_Size) + check.passesOption() + "\n";
     g_CrashMessageLength = message.copy(g_CrashMessage, sizeof g_CrashMessage);
   }
 
@@ -133,7 +144,7 @@ private:
   std::ostream& m_Err;
   std::uint64_t m_FirstSeed;
   std::uint64_t m_Size;
-  ProgramCheck m_Check;
+  std::string m_Tool;
   std::uint64_t m_Failures = 0;
   Clock::time_point m_Start = Clock::now();
   KvCSSAControl m_Control;

@@ -212,6 +212,12 @@ const OptionSpec kOptions[] = {
      [](Options& options, const std::string& value) {
        return parseCount("--programs", value, 1, options.programs);
      }},
+    {"--random-passes", nullptr, kFuzz,
+     "take each program through a random order of passes that can run, drawn from its seed, instead of --passes or the default pipeline",
+     [](Options& options, const std::string&) {
+       options.randomPasses = true;
+       return std::string();
+     }},
     {"--color", "WHEN", kReadingAProgram,
      "colour diagnostics: auto (when standard error is a terminal, the default), always or never",
      [](Options& options, const std::string& value) {
@@ -335,6 +341,7 @@ private:
     if (options.inputPath == "-" && options.inputsPath == std::string("-"))
       return "standard input can give the program or the input values, not both";
     std::vector<std::string> pipeline = options.passes.value_or(defaultPipeline());
+    if (options.randomPasses && options.passes) return "--random-passes and --passes exclude each other";
     if (options.passes) {
       std::string error = findPipelineError(*options.passes);
       if (!error.empty()) return error;
@@ -366,15 +373,6 @@ private:
   const std::vector<std::string>& m_Arguments;
   ParsedOptions m_Parsed;
 };
-
-// " (after ssa, divide)", " (before ssa)" or " (once)" for a pass that can run only there.
-std::string whereThePassRuns(const Pass& pass) {
-  std::string after;
-  for (std::string_view need : pass.needs) after += (after.empty() ? "after " : ", ") + std::string(need);
-  if (!after.empty()) return " (" + after + ")";
-  if (!pass.beforeSSAOnly) return "";
-  return std::string_view(pass.name) == "ssa" ? " (once)" : " (before ssa)";
-}
 
 // The option as the usage shows it, "--steps N" or "-o FILE".
 std::string spelling(const OptionSpec& option) {

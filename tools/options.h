@@ -57,6 +57,8 @@ struct Options {
   // Of generate and fuzz: the size of each program, and how many programs fuzz checks.
   std::optional<std::uint64_t> size;
   std::optional<std::uint64_t> programs;
+  // Of fuzz: each program goes through a random pipeline that can run, drawn from its seed.
+  bool randomPasses = false;
   // Of reduce: the command that must keep failing (empty: check, else cc-check, on the program), and
   // a text its output must show for the failure to count as the same.
   std::vector<std::string> reduceCommand;

@@ -1,91 +1,19 @@
 #include "passes.h"
 
-#include <algorithm>
-
 #include "ssaopt/client/front_end.h"
-#include "ssaopt/client/hoisting.h"
-#include "ssaopt/client/inlining.h"
+#include "ssaopt/client/pipeline.h"
 
 namespace ssaopt::tool {
 
-namespace {
-
-// A transformation joins the tool with one line here, and the default pipeline too when it is named
-// in kTypicalRun.
-const std::vector<Pass> kPasses = {
-    {"inline",
-     "put the body of each procedure called from one place in place of its call",
-     [](client::Program& program) { client::inlineProcedures(program); },
-     {},
-     true},
-    {"valid-conditions", "record on each branch what its condition implies (virtual assignments)",
-     [](client::Program& program) { program.graph().insertValidConditionAssignments(); }},
-    {"ssa",
-     "transform to SSA form (registering every call not yet registered first)",
-     [](client::Program& program) {
-       program.completeCallLists();
-       program.graph().transformToSSAForm();
-     },
-     {},
-     true},
-    {"divide", "give every block one phi function, one statement or its condition alone",
-     [](client::Program& program) {
-       program.transformKeepingLabels([&program] { program.graph().divideBasicBlock(); });
-     }},
-    {"sccp",
-     "sparse conditional constant propagation, removing unreachable code",
-     [](client::Program& program) { program.graph().propagateSparseConditionalConstant(true); },
-     {"ssa", "divide"},
-     false,
-     {"ssa-edges"}},
-    {"sccp-keep-dead",
-     "sparse conditional constant propagation, keeping unreachable code",
-     [](client::Program& program) { program.graph().propagateSparseConditionalConstant(false); },
-     {"ssa", "divide"},
-     false,
-     {"ssa-edges"}},
-    {"ssa-edges", "add the SSA def-use edges",
-     [](client::Program& program) { program.graph().addSSAEdges(); }},
-    {"propagate",
-     "propagate constants over the SSA edges present, removing unreachable code",
-     [](client::Program& program) { program.graph().sparseConditionalConstant(true); },
-     {"ssa", "divide", "ssa-edges"}},
-    {"propagate-keep-dead",
-     "propagate constants over the SSA edges present, keeping unreachable code",
-     [](client::Program& program) { program.graph().sparseConditionalConstant(false); },
-     {"ssa", "divide", "ssa-edges"}},
-    {"replace-constants", "put constants in place of reads of constant variables",
-     [](client::Program& program) { program.graph().replaceConstantVariables(); }},
-    {"replace-conditions", "put constants in place of constant branch conditions",
-     [](client::Program& program) { program.graph().replaceConstantConditions(); }},
-    {"fold", "fold constant sub-expressions",
-     [](client::Program& program) { program.graph().foldConstants(); }},
-    {"remove-unused", "remove definitions of erasable variables that nothing uses",
-     [](client::Program& program) { program.graph().removeUnusedVarDefs(); }},
-    {"hoist", "move statements that both branches of an if/else begin with before the branch",
-     [](client::Program& program) { client::hoistCodeOutOfIfElseBranches(program); }},
-};
-
-const char* const kTypicalRun[] = {
-    "inline", "valid-conditions", "ssa",  "divide", "sccp", "replace-constants", "replace-conditions",
-    "fold",   "remove-unused",    "hoist"};
-
-}  // namespace
-
-const std::vector<Pass>& passRegistry() { return kPasses; }
+ssaopt::PipelineSteps passRegistry() { return ssaopt::pipelineSteps(); }
 
 const Pass* findPass(std::string_view name) {
-  for (const Pass& pass : kPasses)
+  for (const Pass& pass : passRegistry())
     if (name == pass.name) return &pass;
   return nullptr;
 }
 
-std::vector<std::string> defaultPipeline() {
-  std::vector<std::string> pipeline;
-  for (const char* name : kTypicalRun)
-    if (findPass(name)) pipeline.push_back(name);
-  return pipeline;
-}
+std::vector<std::string> defaultPipeline() { return client::namesOf(ssaopt::typicalRun()); }
 
 std::string joinedPassNames(const std::vector<std::string>& names) {
   std::string joined;
@@ -97,41 +25,53 @@ std::string findUnknownPass(const std::vector<std::string>& pipeline) {
   for (const std::string& name : pipeline) {
     if (findPass(name)) continue;
     std::vector<std::string> known;
-    for (const Pass& pass : kPasses) known.push_back(pass.name);
+    for (const Pass& pass : passRegistry()) known.push_back(pass.name);
     return "unknown pass '" + name + "'; known passes: " + joinedPassNames(known);
   }
   return "";
 }
 
+std::string findPipelineError(const std::vector<std::string>& pipeline) {
+  std::string unknown = findUnknownPass(pipeline);
+  if (!unknown.empty()) return unknown;
+  return ssaopt::findPipelineProblem(client::pipelineNamed(pipeline), client::kLoadedProgramState).cstring();
+}
+
+std::string whereThePassRuns(const Pass& pass) {
+  std::string where = ssaopt::describeWhereStepRuns(pass).cstring();
+  return where.empty() ? "" : " (" + where + ")";
+}
+
 namespace {
 
-// Whether a pass before `at` did the work of pass `name`.
-bool ranEarlier(std::string_view name, const std::vector<std::string>& pipeline,
-                std::vector<std::string>::const_iterator at) {
-  return std::any_of(pipeline.begin(), at, [name](const std::string& earlier) {
-    const std::vector<std::string_view>& includes = findPass(earlier)->includes;
-    return earlier == name || std::find(includes.begin(), includes.end(), name) != includes.end();
-  });
+// splitmix64: a good spread from consecutive seeds.
+std::uint64_t nextRandom(std::uint64_t& state) {
+  std::uint64_t z = (state += 0x9e3779b97f4a7c15ULL);
+  z = (z ^ (z >> 30)) * 0xbf58476d1ce4e5b9ULL;
+  z = (z ^ (z >> 27)) * 0x94d049bb133111ebULL;
+  return z ^ (z >> 31);
 }
 
 }  // namespace
 
-std::string findPipelineError(const std::vector<std::string>& pipeline) {
-  std::string unknown = findUnknownPass(pipeline);
-  if (!unknown.empty()) return unknown;
-  for (auto at = pipeline.begin(); at != pipeline.end(); ++at) {
-    const Pass& pass = *findPass(*at);
-    if (pass.beforeSSAOnly && ranEarlier("ssa", pipeline, at))
-      return *at == "ssa" ? "pass 'ssa' can run only once" : "pass '" + *at + "' must come before 'ssa'";
-    for (std::string_view need : pass.needs)
-      if (!ranEarlier(need, pipeline, at))
-        return "pass '" + *at + "' needs '" + std::string(need) + "' earlier in the pipeline";
+std::vector<std::string> randomLegalPipeline(std::uint64_t seed, std::size_t maxLength) {
+  std::uint64_t state = seed;
+  std::size_t length = 1 + nextRandom(state) % maxLength;
+  std::vector<std::string> pipeline;
+  ssaopt::GraphState graphState = client::kLoadedProgramState;
+  for (std::size_t i = 0; i < length; ++i) {
+    std::vector<const Pass*> candidates;
+    for (const Pass& pass : passRegistry())
+      if (ssaopt::canRun(pass, graphState)) candidates.push_back(&pass);
+    const Pass* pChosen = candidates[nextRandom(state) % candidates.size()];
+    pipeline.push_back(pChosen->name);
+    graphState = ssaopt::stateAfter(pChosen->operation, graphState);
   }
-  return "";
+  return pipeline;
 }
 
 void runPipeline(const std::vector<std::string>& pipeline, client::Program& program) {
-  for (const std::string& name : pipeline) findPass(name)->run(program);
+  client::runPipeline(program, pipeline);
 }
 
 std::unique_ptr<client::Program> loadProgramAndRunPipeline(const std::string& path,

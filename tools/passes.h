@@ -1,32 +1,24 @@
-// The passes the tool can run: each public operation of the graph that transforms it, by name.
+// The passes the tool can run: the named steps of the library's pipeline (ssaopt/cfg/pipeline.h),
+// with the reference client taking part in them. Where a pass can run comes from the library's
+// contracts of the steps, walked from the state in which the front end leaves a program.
 #pragma once
 
+#include <cstdint>
 #include <memory>
 #include <ostream>
 #include <string>
 #include <string_view>
 #include <vector>
 
+#include "ssaopt/cfg/pipeline.h"
 #include "ssaopt/client/program.h"
 
 namespace ssaopt::tool {
 
-struct Pass {
-  const char* name;
-  const char* summary;
-  void (*run)(client::Program& program);
-  // Passes that must have run earlier in a pipeline: the library's operations rely on the graph's
-  // state (constant propagation on a divided graph in SSA form; propagation over SSA edges on the
-  // edges being there) and misbehave, some never ending, without it.
-  std::vector<std::string_view> needs = {};
-  // Whether the pass works on a graph before the SSA transformation only.
-  bool beforeSSAOnly = false;
-  // Passes whose work this one does as well, which meets their needs.
-  std::vector<std::string_view> includes = {};
-};
+using Pass = ssaopt::PipelineStep;
 
 // Every pass, in the order of the typical run where they take part in it.
-const std::vector<Pass>& passRegistry();
+ssaopt::PipelineSteps passRegistry();
 
 // Null for a name that no pass has.
 const Pass* findPass(std::string_view name);
@@ -43,10 +35,17 @@ std::string joinedPassNames(const std::vector<std::string>& names);
 // every name is known.
 std::string findUnknownPass(const std::vector<std::string>& pipeline);
 
-// The unknown pass error, else "pass 'x' needs 'y' earlier in the pipeline" or "pass 'x' must come
-// before 'ssa'" for the first pass whose needs the passes before it do not meet; empty when the
-// pipeline can run.
+// The unknown pass error, else why the first pass that cannot run where it stands cannot ("pass
+// 'divide' cannot run after 'ssa-edges': SSA edges are present (...)"); empty when the pipeline can
+// run on a program as the front end leaves it.
 std::string findPipelineError(const std::vector<std::string>& pipeline);
+
+// " (needs SSA form, divided blocks)" for a pass that cannot run everywhere; empty otherwise.
+std::string whereThePassRuns(const Pass& pass);
+
+// A random pipeline that can run on a program as the front end leaves it: up to `maxLength` passes,
+// each drawn from those that can run after the ones before. The same seed gives the same pipeline.
+std::vector<std::string> randomLegalPipeline(std::uint64_t seed, std::size_t maxLength);
 
 // Runs the passes named in `pipeline`, in order; every name must be known.
 void runPipeline(const std::vector<std::string>& pipeline, client::Program& program);

@@ -1,5 +1,5 @@
-// The library's internal checks switched on for a run, and what they report: the driver's --verify
-// and every program of the fuzz command use it.
+// The library's internal checks switched on for a run, its verifier after the front end and every
+// pass, and what they report: the driver's --verify and every program of the fuzz command use it.
 #pragma once
 
 #include <ostream>
@@ -17,9 +17,10 @@ public:
   Verification(const Verification&) = delete;
   Verification& operator=(const Verification&) = delete;
 
-  // The check every transformation keeps, reported as the SSA driver reports it.
+  // The library's verifier: every violation is reported, then the condition "verify()" named after
+  // what the graph was checked after.
   void checkGraph(const KvCControlFlowGraph& graph, const std::string& after) {
-    if (!graph.checkConsistency()) ssaopt::reportConsistencyFailure(after.c_str(), 0, "checkConsistency()");
+    if (!graph.verify()) ssaopt::reportConsistencyFailure(after.c_str(), 0, "verify()");
   }
 
   // Writes every report; true when there was none.

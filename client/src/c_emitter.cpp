@@ -106,13 +106,13 @@ private:
   }
 
   node firstBlock(const ProcedureView& procedure) const {
-    std::vector<edge> out = controlOut(procedure.pProcedure->getEntryNode());
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(procedure.pProcedure->getEntryNode());
     return out.size() == 1 ? onlyReachedFrom(m_Graph.target(out.front())) : ssaopt::nil;
   }
 
   // The block that `v` always goes on to, where nothing else leads to it.
   node onlyContinuation(node v) const {
-    std::vector<edge> out = controlOut(v);
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(v);
     if (m_Graph.getBasicBlock(v)->getBranchCond() || out.size() != 1) return ssaopt::nil;
     return onlyReachedFrom(m_Graph.target(out.front()));
   }
@@ -195,7 +195,7 @@ private:
         blocks.push_back(v);
     };
     node entry = procedure.pProcedure->getEntryNode();
-    std::vector<edge> out = controlOut(entry);
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(entry);
     if (out.size() == 1) place(m_Graph.target(out.front()));
     for (node v : procedure.blocks) place(v);
     if (auto all = m_BlocksByProcedure.find(procedure.pProcedure); all != m_BlocksByProcedure.end())
@@ -252,7 +252,7 @@ private:
   std::vector<std::string> terminatorLines(Function& function, node v, const KvCBasicBlock& block,
                                            node next) {
     KvCCfgExpression* pCondition = block.getBranchCond();
-    std::vector<edge> out = controlOut(v);
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(v);
     if (!pCondition) {
       if (out.size() != 1)
         return {faultLine(function, blockName(block) + " has " + std::to_string(out.size()) +
@@ -289,7 +289,7 @@ private:
 
   std::string resumeLines(Function& function) {
     if (function.loop == ssaopt::nil) return "  (void)ssa_resume;\n";
-    std::vector<edge> out = controlOut(function.loop);
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(function.loop);
     std::string loopName = blockName(*m_Graph.getBasicBlock(function.loop));
     return std::string(kIndent) + "if (ssa_resume == " + kResumeAtHead + ") " +
            jumpText(function, branchTarget(out, true), loopName + " goes true") + "\n" + kIndent +
@@ -297,20 +297,13 @@ private:
            jumpText(function, branchTarget(out, false), loopName + " goes false") + "\n";
   }
 
-  node branchTarget(const std::vector<edge>& out, bool onTrue) const {
+  node branchTarget(const ssaopt::array<edge>& out, bool onTrue) const {
     for (edge e : out) {
       KvCCfgEdgeInfo* pKind = m_Graph.inf(e);
       if (pKind && (onTrue ? pKind->isTrueBranch() != nullptr : pKind->isFalseBranch() != nullptr))
         return m_Graph.target(e);
     }
     return ssaopt::nil;
-  }
-
-  std::vector<edge> controlOut(node v) const {
-    std::vector<edge> out;
-    for (edge e : m_Graph.out(v))
-      if (!m_Graph.inf(e) || !m_Graph.inf(e)->isSSAEdge()) out.push_back(e);
-    return out;
   }
 
   // ---- The interface of the unit -----------------------------------------------------------------

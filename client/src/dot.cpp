@@ -133,7 +133,7 @@ private:
   void writeControlEdges(node box, node last) {
     KvCBasicBlock* pBlock = m_Graph.getBasicBlock(last);
     bool onTrue = false, onFalse = false;
-    for (edge e : m_View.controlOutEdges(last)) {
+    for (edge e : m_Graph.getControlFlowOutEdges(last)) {
       KvCCfgEdgeInfo* pInfo = m_Graph.inf(e);
       std::vector<std::string> attributes;
       if (pInfo->isTrueBranch()) attributes.push_back("label=\"T\""), onTrue = true;

@@ -5,6 +5,7 @@
 #include <sstream>
 #include <utility>
 
+#include "ssaopt/client/hoisting.h"
 #include "ssaopt/client/numbers.h"
 #include "ssaopt/client/variable.h"
 
@@ -119,8 +120,8 @@ bool KvCCfgSFExpression::generatesSameCodeAs(const KvCCfgSFExpression& other) co
     const Term& theirs = other.m_Terms[i];
     if (mine.op != theirs.op) return false;
     if (mine.op == TermOp::Literal && !sameNumber(mine.number, theirs.number)) return false;
-    if (ssaopt::client::namesVariable(mine.op) &&
-        ssaopt::client::originalOf(mine.pVariable) != ssaopt::client::originalOf(theirs.pVariable))
+    if (ssaopt::client::namesVariable(mine.op) && ssaopt::client::versionReadAfterHoisting(mine.pVariable) !=
+                                                      ssaopt::client::versionReadAfterHoisting(theirs.pVariable))
       return false;
   }
   return true;
@@ -128,6 +129,15 @@ bool KvCCfgSFExpression::generatesSameCodeAs(const KvCCfgSFExpression& other) co
 
 bool KvCCfgSFExpression::isElementWrite() const {
   return !m_Terms.empty() && m_Terms.back().op == TermOp::ElementWrite;
+}
+
+// The value of an element write is the complete sub-expression right before it; one that ends in a
+// literal is that literal.
+double* KvCCfgSFExpression::storedLiteral(Terms& terms) {
+  bool elementWrite = !terms.empty() && terms.back().op == TermOp::ElementWrite;
+  if (terms.size() != 1 && !(elementWrite && terms.size() >= 3)) return nullptr;
+  Term& value = terms[elementWrite ? terms.size() - 2 : 0];
+  return value.op == TermOp::Literal ? &value.number : nullptr;
 }
 
 namespace ssaopt::client {

@@ -44,7 +44,7 @@ KvCCfgValue valueWithVariablesUnknown(const KvCCfgSFExpression::Term& term, cons
 
 // The folded terms grow like a stack: a sub-expression that turns out constant is cut off the end and
 // replaced by its literal, so the pass is linear.
-void KvCCfgSFExpression::foldConstants() {
+KvCCfgSFExpression::Terms KvCCfgSFExpression::foldedTerms() const {
   Terms folded;
   folded.reserve(m_Terms.size());
   std::vector<Folded> stack;
@@ -63,5 +63,7 @@ void KvCCfgSFExpression::foldConstants() {
     }
     stack.push_back(result);
   }
-  m_Terms = std::move(folded);
+  return folded;
 }
+
+void KvCCfgSFExpression::foldConstants() { m_Terms = foldedTerms(); }

@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <unordered_map>
+#include <unordered_set>
 #include <vector>
 
 #include "ssaopt/client/statements.h"
@@ -27,21 +28,26 @@ struct AgreedHoist {
 };
 using Agreements = std::vector<AgreedHoist>;
 
-// What the running step has heard, in the order the library asked; null while no step listens. The
-// library is driven from one thread, and a step listens only while the library's pass runs, so no
-// other removal (KvCBasicBlock::del) is taken for a dropped twin.
-Agreements* s_pHeard = nullptr;
+// A twin's SSA version -> the hoisted statement's version.
+using Renaming = std::unordered_map<KvCCfgVariable*, KvCCfgVariable*>;
+
+// What the running step has heard, in the order the library asked, and the versions that the moves
+// agreed so far will rename; null while no step listens. The library is driven from one thread, and a
+// step listens only while the library's pass runs, so no other removal (KvCBasicBlock::del) is taken
+// for a dropped twin.
+struct Heard {
+  Agreements agreements;
+  Renaming twinVersions;
+};
+Heard* s_pHeard = nullptr;
 
 class Listening {
 public:
-  explicit Listening(Agreements& heard) { s_pHeard = &heard; }
+  explicit Listening(Heard& heard) { s_pHeard = &heard; }
   ~Listening() { s_pHeard = nullptr; }
   Listening(const Listening&) = delete;
   Listening& operator=(const Listening&) = delete;
 };
-
-// A twin's SSA version -> the hoisted statement's version.
-using Renaming = std::unordered_map<KvCCfgVariable*, KvCCfgVariable*>;
 
 KvCCfgVariable* renamed(KvCCfgVariable* pVariable, const Renaming& renaming) {
   auto found = renaming.find(pVariable);
@@ -88,7 +94,7 @@ public:
   void apply(const Agreements& agreements) {
     findNodesOf(agreements);
     for (const AgreedHoist& agreed : agreements)
-      if (agreed.pTwin) applyOne(agreed);
+      if (agreed.pTwin && !applyOne(agreed)) abandonBranchOf(agreed);
     if (!m_Renaming.empty()) renameReads();
   }
 
@@ -106,13 +112,15 @@ private:
         }
   }
 
-  void applyOne(const AgreedHoist& agreed) {
+  // The library compared a pair with the versions that the pairs agreed before it at the same branch
+  // would leave, so a pair moves only while those before it did.
+  bool applyOne(const AgreedHoist& agreed) {
     node hoisted = linkHolding(agreed.pHoisted);
     node twin = linkHolding(agreed.pTwin);
     node branch = hoisted && twin ? branchAbove(hoisted) : nil;
-    if (!branch || branchAbove(twin) != branch) return;
+    if (!branch || branchAbove(twin) != branch || m_Abandoned.count(branch.index())) return false;
     node condition = conditionAlone(branch);
-    if (!condition) return;
+    if (!condition) return false;
     if (agreed.pTwin->getLHS() != agreed.pHoisted->getLHS())
       m_Renaming[agreed.pTwin->getLHS()] = agreed.pHoisted->getLHS();
     cutOut(twin);
@@ -120,6 +128,13 @@ private:
     m_Graph.del_node(twin);
     cutOut(hoisted);
     insertBefore(condition, hoisted);
+    return true;
+  }
+
+  void abandonBranchOf(const AgreedHoist& agreed) {
+    node hoisted = m_NodeOf.at(agreed.pHoisted);
+    node branch = hoisted ? branchAbove(hoisted) : nil;
+    if (branch) m_Abandoned.insert(branch.index());
   }
 
   // The library agrees on blocks that hold the statement alone on a branch: one way in, one way on.
@@ -195,27 +210,36 @@ private:
   KvCControlFlowGraph& m_Graph;
   std::unordered_map<KvCCfgStatement*, node> m_NodeOf;
   Renaming m_Renaming;
+  std::unordered_set<std::uint32_t> m_Abandoned;  // branch nodes whose later pairs stay
 };
 
 }  // namespace
 
-void hoistCodeOutOfIfElseBranches(Program& program) {
-  Agreements agreements;
+void hoistAsAgreed(Program& program, const std::function<void()>& hoistStep) {
+  Heard heard;
   {
-    Listening listening(agreements);
-    program.graph().hoistCodeOutOfIfElseBranches();
+    Listening listening(heard);
+    hoistStep();
   }
-  HoistApplier(program).apply(agreements);
+  HoistApplier(program).apply(heard.agreements);
 }
 
 bool agreeToHoist(KvCCfgSFAssignment* pHoisted) {
   if (!s_pHeard) return false;
-  s_pHeard->push_back(AgreedHoist{pHoisted, nullptr});
+  s_pHeard->agreements.push_back(AgreedHoist{pHoisted, nullptr});
   return true;
 }
 
 void noteDroppedTwin(KvCCfgSFAssignment* pTwin) {
-  if (s_pHeard && !s_pHeard->empty() && !s_pHeard->back().pTwin) s_pHeard->back().pTwin = pTwin;
+  if (!s_pHeard || s_pHeard->agreements.empty() || s_pHeard->agreements.back().pTwin) return;
+  AgreedHoist& agreed = s_pHeard->agreements.back();
+  agreed.pTwin = pTwin;
+  if (pTwin->getLHS() != agreed.pHoisted->getLHS())
+    s_pHeard->twinVersions[pTwin->getLHS()] = agreed.pHoisted->getLHS();
+}
+
+KvCCfgVariable* versionReadAfterHoisting(KvCCfgVariable* pVariable) {
+  return s_pHeard ? renamed(pVariable, s_pHeard->twinVersions) : pVariable;
 }
 
 }  // namespace ssaopt::client

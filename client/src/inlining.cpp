@@ -22,7 +22,7 @@ bool holdsCall(const KvCBasicBlock& block) {
 // The in-edges of an inlined call block move to its parameter block, payloads and all, while the
 // edges themselves may go with a procedure inlined later: so the payload of one in-edge identifies
 // where each labelled call block went.
-void inlineProcedures(Program& program) {
+void inlineKeepingLabels(Program& program, const std::function<void()>& inlineStep) {
   KvCControlFlowGraph& graph = program.graph();
   std::unordered_map<KvCCfgEdgeInfo*, std::uint32_t> labelledCallEnteredBy;
   for (ssaopt::node v : graph.nodes()) {
@@ -30,7 +30,7 @@ void inlineProcedures(Program& program) {
     if (pBlock && graph.indeg(v) > 0 && program.blockLabel(pBlock->getIndex()) && holdsCall(*pBlock))
       labelledCallEnteredBy[graph.inf(graph.first_in_edge(v))] = pBlock->getIndex();
   }
-  graph.inlineProcedures();
+  inlineStep();
   for (ssaopt::edge e : graph.edges()) {
     auto found = labelledCallEnteredBy.find(graph.inf(e));
     KvCBasicBlock* pTarget = graph.getBasicBlock(graph.target(e));

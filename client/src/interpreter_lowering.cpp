@@ -225,7 +225,7 @@ private:
       jumpToOnlySuccessor(v, code);
       return;
     }
-    for (edge e : controlFlowOut(v)) {
+    for (edge e : m_Graph.getControlFlowOutEdges(v)) {
       KvCCfgEdgeInfo* pKind = m_Graph.inf(e);
       if (pKind && pKind->isTrueBranch() && code.next == kNoNode) code.next = m_Graph.target(e).index();
       if (pKind && pKind->isFalseBranch() && code.onFalse == kNoNode)
@@ -244,21 +244,13 @@ private:
   }
 
   void jumpToOnlySuccessor(node v, NodeCode& code) const {
-    std::vector<edge> out = controlFlowOut(v);
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(v);
     if (out.size() == 1) {
       code.flow = Flow::Jump;
       code.next = m_Graph.target(out.front()).index();
       return;
     }
     code.fault = code.name + " has " + std::to_string(out.size()) + " successors and no condition";
-  }
-
-  // The out-edges that carry control; SSA edges share the graph with them.
-  std::vector<edge> controlFlowOut(node v) const {
-    std::vector<edge> out;
-    for (edge e : m_Graph.out(v))
-      if (!m_Graph.inf(e) || !m_Graph.inf(e)->isSSAEdge()) out.push_back(e);
-    return out;
   }
 
   std::uint32_t startNode() const {

@@ -91,7 +91,7 @@ private:
   // A single successor is left implicit where the text falls through to it: the next block, or the
   // end after the last block.
   void printTerminator(node v, const KvCBasicBlock& block, node next) {
-    std::vector<edge> out = m_View.controlOutEdges(v);
+    ssaopt::array<edge> out = m_View.graph().getControlFlowOutEdges(v);
     if (block.getBranchCond()) {
       m_Out << kIndent << "if " << detail::expressionText(m_View, block.getBranchCond()) << " goto "
             << branchTarget(out, true) << " else " << branchTarget(out, false) << ";\n";
@@ -105,7 +105,7 @@ private:
       m_Out << kIndent << "goto " << (target == ssaopt::nil ? "end" : targetName(target)) << ";\n";
   }
 
-  std::string branchTarget(const std::vector<edge>& out, bool onTrue) const {
+  std::string branchTarget(const ssaopt::array<edge>& out, bool onTrue) const {
     for (edge e : out) {
       KvCCfgEdgeInfo* pInfo = m_View.graph().inf(e);
       if (onTrue ? pInfo->isTrueBranch() != nullptr : pInfo->isFalseBranch() != nullptr)
@@ -116,7 +116,7 @@ private:
 
   // Where constant propagation decided something: which edges out of a branch it found executable.
   void printExecutableEdges(node v) {
-    std::vector<edge> out = m_View.controlOutEdges(v);
+    ssaopt::array<edge> out = m_View.graph().getControlFlowOutEdges(v);
     if (!m_View.graph().getBasicBlock(v)->getBranchCond() || out.empty()) return;
     m_Out << kIndent << "//";
     for (std::size_t i = 0; i < out.size(); ++i)

@@ -1,10 +1,8 @@
 #include "ssaopt/client/program.h"
 
-#include <unordered_set>
 #include <utility>
 
 #include "ssaopt/ir/node_info.h"
-#include "ssaopt/ir/procedure.h"
 #include "ssaopt/ir/statement.h"
 
 namespace ssaopt::client {
@@ -74,24 +72,6 @@ void Program::transformKeepingLabels(const std::function<void()>& transform) {
     KvCBasicBlock* pBlock = m_pGraph->getBasicBlock(v);
     auto found = pBlock ? labelsByContent.find(firstContentOf(*pBlock)) : labelsByContent.end();
     if (found != labelsByContent.end()) setBlockLabel(pBlock->getIndex(), found->second);
-  }
-}
-
-// Each procedure's list is copied once, so the whole walk is linear in the number of calls.
-void Program::completeCallLists() {
-  std::unordered_set<KvCCfgProcedureCall*> registered;
-  for (const auto& entry : m_pGraph->getProcedures())
-    for (KvCCfgProcedureCall* pCall : entry.second->getCalls()) registered.insert(pCall);
-  for (ssaopt::node v : m_pGraph->nodes()) {
-    KvCBasicBlock* pBlock = m_pGraph->getBasicBlock(v);
-    if (!pBlock) continue;
-    for (KvCCfgStatement* pStatement : pBlock->getStatementSeq()) {
-      KvCCfgProcedureCall* pCall = pStatement->isProcedureCall();
-      if (!pCall || registered.count(pCall)) continue;
-      KvCCfgProcedure* pCallee = m_pGraph->findProcedure(pCall->getName());
-      if (pCallee) pCallee->appendCall(pCall);
-      registered.insert(pCall);
-    }
   }
 }
 

@@ -47,7 +47,6 @@ ProgramView::ProgramView(const Program& program)
     : m_Program(program),
       m_Graph(program.graph()),
       m_Hidden(program.graph(), false),
-      m_Placed(program.graph(), false),
       m_NamedByPhis(program.graph(), false) {
   findHiddenBlocks();
   findNamedBlocksAndCalls();
@@ -72,7 +71,7 @@ void ProgramView::findHiddenBlocks() {
   while (!work.empty()) {
     node end = work.back();
     work.pop_back();
-    for (edge e : controlInEdges(end)) {
+    for (edge e : m_Graph.getControlFlowInEdges(end)) {
       node v = m_Graph.source(e);
       if (!m_Hidden[v] && onlyLeadsToTheEnd(v)) {
         m_Hidden[v] = true;
@@ -92,7 +91,7 @@ bool ProgramView::isUntouchedMainLoop(node v) const {
   node mainEntry = pBlock->getProcedure()->getEntryNode();
   if (m_Graph.outdeg(mainEntry) == 0) return false;
   node firstOfMain = m_Graph.target(m_Graph.first_adj_edge(mainEntry));
-  for (edge e : controlOutEdges(v)) {
+  for (edge e : m_Graph.getControlFlowOutEdges(v)) {
     KvCCfgEdgeInfo* pInfo = m_Graph.inf(e);
     node target = m_Graph.target(e);
     if (pInfo->isTrueBranch() && target != firstOfMain) return false;
@@ -104,7 +103,7 @@ bool ProgramView::isUntouchedMainLoop(node v) const {
 bool ProgramView::onlyLeadsToTheEnd(node v) const {
   KvCBasicBlock* pBlock = m_Graph.getBasicBlock(v);
   if (!pBlock || !isEmptyBlock(*pBlock)) return false;
-  std::vector<edge> out = controlOutEdges(v);
+  ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(v);
   return out.size() == 1 && isEnd(m_Graph.target(out[0]));
 }
 
@@ -114,39 +113,19 @@ bool ProgramView::isShownBlock(node v) const { return m_Graph.getBasicBlock(v) &
 
 // ---- Layout -----------------------------------------------------------------------------------------
 
+// Read back, a printed program has its nodes in the printed order, so the same order gives the same
+// text.
 void ProgramView::layOutProcedures() {
-  std::map<std::uint32_t, KvCCfgProcedure*> byEntry;
-  for (const auto& entry : m_Graph.getProcedures())
-    byEntry.emplace(entry.second->getEntryNode().index(), entry.second);
-  std::unordered_map<KvCCfgProcedure*, std::vector<node>> nodesOf;
-  for (node v : m_Graph.nodes())
-    if (isShownBlock(v)) nodesOf[m_Graph.inf(v)->getProcedure()].push_back(v);
-  for (const auto& entry : byEntry) {
-    ProcedureView procedure{entry.second, entry.second->getName().cstring(), {}};
-    layOut(procedure, nodesOf[entry.second]);
-    m_Procedures.push_back(std::move(procedure));
-  }
+  for (const ssaopt::ProcedureBlocks& laidOut :
+       m_Graph.getProgramOrder([this](node v) { return !m_Hidden[v]; }))
+    m_Procedures.push_back(ProcedureView{laidOut.pProcedure, laidOut.pProcedure->getName().cstring(),
+                                         {laidOut.blocks.begin(), laidOut.blocks.end()}});
 }
 
-// The first block, then chains of blocks in node order, each block followed by the block it falls
-// into when nothing else enters that one (the pieces of a divided or split block stay together, a
-// join stays where the text put it). Read back, a printed program has its nodes in the printed order,
-// so the same walk gives the same text.
-void ProgramView::layOut(ProcedureView& procedure, const std::vector<node>& nodes) {
-  std::vector<node> starts;
-  node entry = procedure.pProcedure->getEntryNode();
-  if (m_Graph.outdeg(entry) > 0) starts.push_back(m_Graph.target(m_Graph.first_adj_edge(entry)));
-  starts.insert(starts.end(), nodes.begin(), nodes.end());
-  for (node start : starts)
-    for (node v = start; v != ssaopt::nil && isShownBlock(v) && !m_Placed[v]; v = continuationOf(v)) {
-      m_Placed[v] = true;
-      procedure.blocks.push_back(v);
-    }
-}
-
-// The block that `v` falls into and that nothing else enters, or nil.
+// The block that `v` falls into and that nothing else enters, or nil: where the program order puts
+// the next block of a chain.
 node ProgramView::continuationOf(node v) const {
-  std::vector<edge> out = controlOutEdges(v);
+  ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(v);
   if (out.size() != 1 || m_Graph.getBasicBlock(v)->getBranchCond()) return ssaopt::nil;
   node next = m_Graph.target(out[0]);
   return isShownBlock(next) && hasOneControlInEdge(next) ? next : ssaopt::nil;
@@ -159,7 +138,7 @@ node ProgramView::continuationOf(node v) const {
 // other block continues the one before it; read back, a block without label joins the block before it, and
 // the front end splits it off again where it holds a call.
 bool ProgramView::needsLabel(node v, node previous) const {
-  std::vector<edge> in = controlInEdges(v);
+  ssaopt::array<edge> in = m_Graph.getControlFlowInEdges(v);
   bool continues = in.size() == 1 && m_Graph.source(in[0]) == previous && continuationOf(previous) == v;
   if (previous != ssaopt::nil && !continues) return true;
   if (previous == ssaopt::nil)
@@ -193,10 +172,8 @@ void ProgramView::findNamedBlocksAndCalls() {
   for (node v : m_Graph.nodes()) {
     KvCBasicBlock* pBlock = m_Graph.getBasicBlock(v);
     if (!pBlock) continue;
-    if (!pBlock->getPhiFunctions().empty()) {
-      std::size_t operands = pBlock->getPhiFunctions().front()->getReplacementVariables().size();
-      for (edge e : phiOperandEdges(v, operands)) m_NamedByPhis[m_Graph.source(e)] = true;
-    }
+    if (!pBlock->getPhiFunctions().empty())
+      for (edge e : m_Graph.getPhiOperandEdges(v)) m_NamedByPhis[m_Graph.source(e)] = true;
     for (KvCCfgStatement* pStatement : pBlock->getStatementSeq())
       if (KvCCfgParamStatement* pParam = pStatement->isParamStatement())
         for (const auto& argument : pParam->getArguments()) m_CallsWithParameters.insert(argument.first);
@@ -265,27 +242,6 @@ bool ProgramView::precedes(KvCCfgVariable* a, KvCCfgVariable* b) const {
 
 // ---- Edges ------------------------------------------------------------------------------------------
 
-std::vector<edge> ProgramView::controlOutEdges(node v) const {
-  std::vector<edge> edges;
-  for (edge e : m_Graph.out(v))
-    if (!m_Graph.inf(e)->isSSAEdge()) edges.push_back(e);
-  return edges;
-}
-
-// Dividing a block puts each of its phi functions into a block of its own, chained one after the other;
-// the operands of all of them belong to the in-edges of the first in the chain. Removing unused phi
-// functions may have emptied blocks of the chain since.
-std::vector<edge> ProgramView::phiOperandEdges(node v, std::size_t operands) const {
-  std::vector<edge> in = controlInEdges(v);
-  while (in.size() == 1 && operands != 1) {
-    KvCBasicBlock* pBefore = m_Graph.getBasicBlock(m_Graph.source(in[0]));
-    if (!pBefore || !pBefore->getStatementSeq().empty() || pBefore->getBranchCond()) break;
-    in = controlInEdges(m_Graph.source(in[0]));
-  }
-  return in;
-}
-
-// Without listing them all: a block that many branches join is the continuation of each.
 bool ProgramView::hasOneControlInEdge(node v) const {
   std::size_t count = 0;
   for (edge e : m_Graph.in(v))
@@ -293,27 +249,8 @@ bool ProgramView::hasOneControlInEdge(node v) const {
   return count == 1;
 }
 
-std::vector<edge> ProgramView::controlInEdges(node v) const {
-  std::vector<edge> edges;
-  for (edge e : m_Graph.in(v))
-    if (!m_Graph.inf(e)->isSSAEdge()) edges.push_back(e);
-  return edges;
-}
-
 bool isInSSAForm(const KvCControlFlowGraph& graph) {
-  for (node v : graph.nodes()) {
-    KvCBasicBlock* pBlock = graph.getBasicBlock(v);
-    if (!pBlock) continue;
-    if (!pBlock->getPhiFunctions().empty()) return true;
-    for (KvCCfgStatement* pStatement : pBlock->getStatementSeq()) {
-      if (pStatement->isParamStatement() || pStatement->isValueReturnStatement() ||
-          pStatement->isOutputStatement())
-        return true;
-      for (KvCCfgVariable* pDefined : pStatement->getDefinedVariables())
-        if (pDefined->isSSAVariable()) return true;
-    }
-  }
-  return false;
+  return graph.getState().has(ssaopt::GraphFact::SSAForm);
 }
 
 std::string unusedBlockName(const KvCBasicBlock& block, std::set<std::string>& used) {

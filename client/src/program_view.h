@@ -3,8 +3,8 @@
 //
 // - Procedures in the order of their entry nodes, which is the order of the text for the program's
 //   own procedures, followed by those that outlining made.
-// - Blocks of a procedure: the first block, then chains of blocks in node order (see layOut), which
-//   keeps the order of the text for a program as read.
+// - Blocks of a procedure: the graph's program order (KvCControlFlowGraph::getProgramOrder) of the
+//   blocks shown, which keeps the order of the text for a program as read.
 // - Labels: the block's label in the text where it had one, else "bb" and its index where a label is
 //   needed (see needsLabel).
 // - SSA versions: the variable's name and the version's rank among the versions of that variable by
@@ -52,11 +52,8 @@ public:
   // Declaration order, versions of one variable in their order.
   bool precedes(KvCCfgVariable* a, KvCCfgVariable* b) const;
 
-  // The in-edges that the operands of a phi function of `v` belong to, in operand order.
-  std::vector<ssaopt::edge> phiOperandEdges(ssaopt::node v, std::size_t operands) const;
-  // The control-flow edges (not SSA edges), in adjacency order.
-  std::vector<ssaopt::edge> controlOutEdges(ssaopt::node v) const;
-  std::vector<ssaopt::edge> controlInEdges(ssaopt::node v) const;
+  // Whether `v` has one control-flow in-edge, found without listing them all: a block that many
+  // branches join is asked once for each of them.
   bool hasOneControlInEdge(ssaopt::node v) const;
   // The block that `v` falls into and that nothing else enters, or nil: blocks printed one after the
   // other as one piece of straight-line code.
@@ -67,7 +64,6 @@ private:
   bool isUntouchedMainLoop(ssaopt::node v) const;
   bool onlyLeadsToTheEnd(ssaopt::node v) const;
   void layOutProcedures();
-  void layOut(ProcedureView& procedure, const std::vector<ssaopt::node>& nodes);
   bool isShownBlock(ssaopt::node v) const;
   void findNamedBlocksAndCalls();
   void assignLabels(const ProcedureView& procedure);
@@ -79,7 +75,6 @@ private:
   const KvCControlFlowGraph& m_Graph;
   std::vector<ProcedureView> m_Procedures;
   ssaopt::node_array<bool> m_Hidden;
-  ssaopt::node_array<bool> m_Placed;
   ssaopt::node_array<bool> m_NamedByPhis;
   std::unordered_set<KvCCfgProcedureCall*> m_CallsWithParameters;
   std::unordered_map<std::uint32_t, std::string> m_Labels;  // by node index
@@ -90,8 +85,8 @@ private:
 // "bb" and the block's index, with "_1", "_2", ... added until it is not in `used`; added to `used`.
 std::string unusedBlockName(const KvCBasicBlock& block, std::set<std::string>& used);
 
-// Whether the SSA transformation ran, by what it leaves behind: phi functions, interface statements or
-// versions. Until it has placed the parameter statements, calls pass their arguments themselves.
+// Whether the SSA transformation ran. Until it has placed the parameter statements, calls pass their
+// arguments themselves.
 bool isInSSAForm(const KvCControlFlowGraph& graph);
 
 }  // namespace ssaopt::client::detail

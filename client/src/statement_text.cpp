@@ -145,7 +145,7 @@ std::string statementText(const ProgramView& view, KvCCfgStatement& statement) {
 
 std::string phiText(const ProgramView& view, KvCPhiFunction& phi, ssaopt::node block) {
   ssaopt::array<KvCCfgVariable*> operands = phi.getReplacementVariables();
-  std::vector<ssaopt::edge> in = view.phiOperandEdges(block, operands.size());
+  ssaopt::array<ssaopt::edge> in = view.graph().getPhiOperandEdges(block);
   std::string text;
   for (std::size_t i = 0; i < operands.size(); ++i) {
     std::string from = i < in.size() ? view.predecessorName(view.graph().source(in[i])) : "?";

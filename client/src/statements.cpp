@@ -2,7 +2,9 @@
 
 #include <utility>
 
+#include "front_end_steps.h"
 #include "ssaopt/client/hoisting.h"
+#include "ssaopt/client/interpreter.h"
 #include "ssaopt/client/variable.h"
 
 KvCCfgSFAssignment::KvCCfgSFAssignment(KvCCfgVariable* pLHS, KvCCfgSFExpression* pRHS) {
@@ -19,8 +21,29 @@ KvCCfgStatement* KvCCfgSFAssignment::clone() const {
   return new KvCCfgSFAssignment(getLHS(), pRHS ? pRHS->clone() : nullptr);
 }
 
+namespace {
+
+// Whether `folded` can stand in the text, where the front end rejects a stored literal that does not
+// fit its variable. Such a literal becomes the value the store leaves, which stores the same, except
+// where the cast wraps a value past a saturation limit (-1 into a uint32 saturated at 20 stores
+// 4294967295, which stored again is 20): the assignment then keeps the computation unfolded.
+bool fitsTheText(KvCCfgSFExpression::Terms& folded, KvCCfgSFVariable* pVariable) {
+  double* pLiteral = KvCCfgSFExpression::storedLiteral(folded);
+  if (!pLiteral || !pVariable || ssaopt::client::detail::variableHolds(*pVariable, *pLiteral)) return true;
+  double stored = ssaopt::client::storedValue(*pVariable, *pLiteral);
+  if (ssaopt::client::storedValue(*pVariable, stored) != stored) return false;
+  *pLiteral = stored;
+  return true;
+}
+
+}  // namespace
+
 void KvCCfgSFAssignment::foldConstants() {
-  if (getRHS()) getRHS()->foldConstants();
+  KvCCfgSFExpression* pRHS = getSFRHS();
+  if (!pRHS) return;
+  KvCCfgSFExpression::Terms folded = pRHS->foldedTerms();
+  KvCCfgSFVariable* pVariable = getLHS() ? ssaopt::client::originalOf(getLHS())->isSFVariable() : nullptr;
+  if (fitsTheText(folded, pVariable)) pRHS->setTerms(std::move(folded));
 }
 
 bool KvCCfgSFAssignment::generatesSameCode(KvCCfgStatement* pOther) const {

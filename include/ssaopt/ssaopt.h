@@ -22,3 +22,5 @@
 #include "ssaopt/ir/variable.h"
 #include "ssaopt/ir/variable_expression.h"
 #include "ssaopt/cfg/control_flow_graph.h"
+#include "ssaopt/cfg/graph_state.h"
+#include "ssaopt/cfg/pipeline.h"

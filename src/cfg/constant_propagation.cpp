@@ -102,12 +102,15 @@ private:
 }  // namespace
 
 void KvCControlFlowGraph::propagateSparseConditionalConstant(bool removeDeadCode) {
+  if (!beginStep(ssaopt::GraphOperation::PropagateSparseConditionalConstant)) return;
   addSSAEdges();
   sparseConditionalConstant(removeDeadCode);
+  endStep(ssaopt::GraphOperation::PropagateSparseConditionalConstant);
 }
 
 // Adding edges leaves the node list alone, so the live view serves.
 void KvCControlFlowGraph::addSSAEdges() {
+  if (!beginStep(ssaopt::GraphOperation::AddSSAEdges)) return;
   buildVarUses();
   for (node v : nodes()) {
     KvCCfgNodeInfo* pInf = inf(v);
@@ -115,6 +118,7 @@ void KvCControlFlowGraph::addSSAEdges() {
     for (KvCCfgVariable* pVariable : pInf->getAssignedVariables())
       for (node user : pVariable->getUses()) new_edge(v, user, new KvCSSAEdge());
   }
+  endStep(ssaopt::GraphOperation::AddSSAEdges);
 }
 
 // Only assigned variables are cleared: a variable that nothing assigns keeps the uses it had.
@@ -133,6 +137,7 @@ void KvCControlFlowGraph::buildVarUses() {
 // exactly (see PropagationRecord), except the last one, whose executable flags are the ones that
 // stay.
 void KvCControlFlowGraph::sparseConditionalConstant(bool removeDeadCode) {
+  if (!beginStep(ssaopt::GraphOperation::SparseConditionalConstant)) return;
   list<edge> cfgWorkList;
   list<edge> ssaWorkList;
   startPropagationRecord();
@@ -153,6 +158,7 @@ void KvCControlFlowGraph::sparseConditionalConstant(bool removeDeadCode) {
   // The flags stay as the last procedure left them; the record of them must not outlive the edges.
   m_ExecutableEdges.clear();
   m_Propagation = PropagationRecord();
+  endStep(ssaopt::GraphOperation::SparseConditionalConstant);
 }
 
 // Numbers the procedures and gives every node the number of the procedure whose entry reaches it

@@ -7,6 +7,7 @@
 //
 // Needs divided blocks and the visited marks of the pass that has just ended.
 #include "ssaopt/cfg/control_flow_graph.h"
+#include "ssaopt/ir/procedure.h"
 #include "ssaopt/ir/statement.h"
 #include "ssaopt/ir/variable.h"
 
@@ -32,11 +33,60 @@ ssaopt::set<KvCCfgVariable*> operandsNoLongerRead(const ssaopt::array<KvCCfgVari
   return removed;
 }
 
+// A parameter statement reads what the arguments of all calls of its procedure read; when a dead
+// block takes a call with it, the argument of that call goes (forgetDeletedStatements), and the use
+// sets must no longer name the parameter's node for what only that argument read. So the nodes of
+// the parameters of every procedure whose call dies are noted with what they read before.
+class ParameterReads {
+public:
+  template <class IsDead>
+  void noteCallsIn(const KvCControlFlowGraph& G, const KvCBasicBlock& block, IsDead isDead) {
+    for (KvCCfgStatement* pStatement : block.getStatementSeq())
+      if (KvCCfgProcedureCall* pCall = pStatement->isProcedureCall())
+        if (const KvCCfgProcedure* pCallee = G.findProcedure(pCall->getName()))
+          if (m_Callees.insert(pCallee).second) noteParametersOf(G, *pCallee, isDead);
+  }
+
+  void dropGoneReads(const KvCControlFlowGraph& G) {
+    for (auto& noted : m_ReadBefore) {
+      ssaopt::set<KvCCfgVariable*> readNow = G.getBasicBlock(noted.first)->getUsedVariables();
+      for (KvCCfgVariable* pVariable : noted.second)
+        if (!readNow.count(pVariable)) pVariable->delUse(noted.first);
+    }
+  }
+
+private:
+  // The parameter statements stand in the blocks right after the entry, together or one per block
+  // (some emptied by removeUnusedVarDefs). A dead node is not noted: its destruction takes it out of
+  // every use set.
+  template <class IsDead>
+  void noteParametersOf(const KvCControlFlowGraph& G, const KvCCfgProcedure& callee, IsDead isDead) {
+    node entry = callee.getEntryNode();
+    node v = entry && G.outdeg(entry) == 1 ? G.target(G.first_adj_edge(entry)) : node(nil);
+    while (v && holdsParametersOrNothing(G.getBasicBlock(v))) {
+      if (!isDead(v)) m_ReadBefore[v] = G.getBasicBlock(v)->getUsedVariables();
+      ssaopt::array<edge> out = G.getControlFlowOutEdges(v);
+      v = out.size() == 1 ? G.target(out[0]) : node(nil);
+    }
+  }
+
+  static bool holdsParametersOrNothing(const KvCBasicBlock* pBlock) {
+    if (!pBlock || pBlock->getBranchCond() || !pBlock->getPhiFunctions().empty()) return false;
+    for (KvCCfgStatement* pStatement : pBlock->getStatementSeq())
+      if (!pStatement->isParamStatement()) return false;
+    return true;
+  }
+
+  ssaopt::set<const KvCCfgProcedure*> m_Callees;
+  ssaopt::map<node, ssaopt::set<KvCCfgVariable*>> m_ReadBefore;
+};
+
 }  // namespace
 
 // Deleting the node in hand is all that happens to the node list, so the live view serves.
 bool KvCControlFlowGraph::eliminateDeadCode() {
   bool removedOperand = false;
+  ParameterReads parameterReads;
   for (node n : nodes()) {
     if (!isDeadBlock(n)) continue;
     unsettleProceduresOfDeadBlock(n);
@@ -44,19 +94,25 @@ bool KvCControlFlowGraph::eliminateDeadCode() {
       removeDeadOperands(t);
       removedOperand = true;
     }
+    parameterReads.noteCallsIn(*this, *getBasicBlock(n), [this](node v) { return isDeadBlock(v); });
     destroyDeadBlock(n);
   }
   forgetDeletedStatements();
+  parameterReads.dropGoneReads(*this);
   return removedOperand;
 }
 
 // Entry and exit nodes stay, reached or not.
 bool KvCControlFlowGraph::isDeadBlock(node v) const { return !isVisited(v) && getBasicBlock(v); }
 
+// The first node of a chain may have lost its phi function to removeUnusedVarDefs while the later
+// ones keep theirs, whose operands still follow its in-edges.
 node KvCControlFlowGraph::reachedPhiSuccessor(node v) const {
   for (edge e = firstCfgOutEdge(v); e; e = nextCfgOutEdge(e)) {
     node t = target(e);
-    if (isVisited(t) && phiFunctionAt(t)) return t;
+    if (!isVisited(t)) continue;
+    for (node link = t; link; link = nextPhiChainLink(link))
+      if (phiFunctionAt(link)) return t;
   }
   return nil;
 }
@@ -71,8 +127,8 @@ KvCPhiFunction* KvCControlFlowGraph::phiFunctionAt(node v) const {
 // two edges into it loses both operands, not one operand of a live edge.
 void KvCControlFlowGraph::removeDeadOperands(node t) {
   ssaopt::array<int> positions = removeDeadInEdges(t);
-  for (node link = t; KvCPhiFunction* pPhi = phiFunctionAt(link); link = nextPhiChainLink(link))
-    removeOperands(link, *pPhi, positions);
+  for (node link = t; link; link = nextPhiChainLink(link))
+    if (KvCPhiFunction* pPhi = phiFunctionAt(link)) removeOperands(link, *pPhi, positions);
 }
 
 // The positions, among t's control-flow in-edges, of those that come from dead blocks, in ascending
@@ -93,10 +149,11 @@ ssaopt::array<int> KvCControlFlowGraph::removeDeadInEdges(node t) {
 
 // Every phi function of the block that divideBasicBlock cut into the chain starting at t has one
 // operand per in-edge of t. The walk follows only the links it made: a block that held nothing but
-// phi functions is followed by another join, whose phi functions belong to other edges.
+// phi functions is followed by another join, whose phi functions belong to other edges. It passes
+// links that removeUnusedVarDefs emptied.
 node KvCControlFlowGraph::nextPhiChainLink(node link) const {
   edge next = firstCfgOutEdge(link);
-  return next && isDividedBlockLink(next) ? target(next) : nil;
+  return next && isPhiChainLink(next) ? target(next) : nil;
 }
 
 // From the back, so that each position still names the operand it named before. A variable that no

@@ -7,6 +7,7 @@
 //   frontiers: DF(B) = DF(C) = {D}, all others empty
 //
 // Needs: per component one node without in-edges, its entry node, that reaches every other node.
+// Dominance is a matter of control flow: SSA edges, where there are any, take no part.
 #include <algorithm>
 #include <cstddef>
 
@@ -89,9 +90,10 @@ private:
         continue;
       }
       node v = frame.v;
-      node w = m_G.target(frame.next);
-      frame.next = m_G.adj_succ(frame.next);
-      if (m_Preorder[w] != kNone) continue;
+      edge e = frame.next;
+      frame.next = m_G.adj_succ(e);
+      node w = m_G.target(e);
+      if (m_Preorder[w] != kNone || !m_G.isControlFlowEdge(e)) continue;
       m_Parent[static_cast<std::size_t>(number(w))] = m_Preorder[v];
       m_DfsStack.push_back({w, m_G.first_adj_edge(w)});
     }
@@ -112,7 +114,7 @@ private:
   void lowerSemiFromPredecessors(int w) {
     for (edge e : m_G.in(vertex(w))) {
       int source = m_Preorder[m_G.source(e)];
-      if (source == kNone) continue;
+      if (source == kNone || !m_G.isControlFlowEdge(e)) continue;
       int u = eval(source);
       if (at(m_Semi, u) < at(m_Semi, w)) at(m_Semi, w) = at(m_Semi, u);
     }
@@ -206,26 +208,28 @@ private:
 // ---- Immediate dominators ------------------------------------------------------------------------
 
 void KvCControlFlowGraph::computeAllIdoms() {
+  node_array<node> idom(*this, nil);
+  computeControlFlowIdoms(idom);
+  for (node v : nodes())
+    if (KvCCfgNodeInfo* pInf = inf(v)) pInf->setIdom(idom[v]);
+}
+
+void KvCControlFlowGraph::computeControlFlowIdoms(node_array<node>& idom) const {
   node_array<int> component;
-  int count = COMPONENTS(*this, component);
+  int count = COMPONENTS(*this, component, [this](edge e) { return isControlFlowEdge(e); });
   array<array<node>> members(static_cast<std::size_t>(count));
   for (node v : nodes()) members[static_cast<std::size_t>(component[v])].push_back(v);
 
   node_array<int> preorder(*this, kNone);
-  node_array<node> idom(*this, nil);
   LengauerTarjan dominators(*this, preorder);
-  for (const array<node>& nodesOfComponent : members) {
-    computeIdomsFast(nodesOfComponent, dominators, idom);
-    for (node v : nodesOfComponent)
-      if (KvCCfgNodeInfo* pInf = inf(v)) pInf->setIdom(idom[v]);
-  }
+  for (const array<node>& nodesOfComponent : members) computeIdomsFast(nodesOfComponent, dominators, idom);
 }
 
 // The root is the last node without in-edges. A component without one (a cycle that nothing
 // enters) is reported and keeps nil as every node's immediate dominator. Having no entry node
 // either, its dominator tree gets no root, and frontiers, phi placement and renaming pass it by.
 void KvCControlFlowGraph::computeIdomsFast(const array<node>& nodes, LengauerTarjan& dominators,
-                                           node_array<node>& idom) {
+                                           node_array<node>& idom) const {
   node root = nil;
   for (node v : nodes)
     if (indeg(v) == 0) root = v;

@@ -155,12 +155,14 @@ void KvCControlFlowGraph::reportProcedureComponentFaults(const node_array<int>& 
 // ---- Block surgery -------------------------------------------------------------------------------
 
 node KvCControlFlowGraph::splitAtStatement(node v, KvCCfgStatement* pStatement) {
+  if (!beginStep(ssaopt::GraphOperation::SplitBlock)) return v;
   KvCBasicBlock* pBlock = requireBasicBlock(v, kLineSplitAtStatementNoPayload, kLineSplitAtStatementNoBlock);
   if (!pBlock) return v;
   return continueInNewNode(v, pBlock, pBlock->splitAtStatement(pStatement));
 }
 
 node KvCControlFlowGraph::splitAtCondition(node v) {
+  if (!beginStep(ssaopt::GraphOperation::SplitBlock)) return v;
   KvCBasicBlock* pBlock = requireBasicBlock(v, kLineSplitAtConditionNoPayload, kLineSplitAtConditionNoBlock);
   if (!pBlock) return v;
   return continueInNewNode(v, pBlock, pBlock->splitAtCondition());
@@ -170,6 +172,7 @@ node KvCControlFlowGraph::splitAtCondition(node v) {
 // the out-edges in their order, so true and false branches keep their payloads and places; `v`
 // keeps its in-edges and continues into it.
 node KvCControlFlowGraph::continueInNewNode(node v, KvCBasicBlock* pBlock, KvCBasicBlock* pTail) {
+  endStep(ssaopt::GraphOperation::SplitBlock);
   if (pTail == pBlock) return v;
   node w = new_node(pTail);
   while (edge e = first_adj_edge(v)) move_edge(e, w, target(e));
@@ -178,8 +181,10 @@ node KvCControlFlowGraph::continueInNewNode(node v, KvCBasicBlock* pBlock, KvCBa
 }
 
 void KvCControlFlowGraph::divideBasicBlock() {
+  if (!beginStep(ssaopt::GraphOperation::DivideBasicBlock)) return;
   for (node v : all_nodes())
     if (const KvCBasicBlock* pBlock = getBasicBlock(v)) replaceByChain(v, *pBlock);
+  endStep(ssaopt::GraphOperation::DivideBasicBlock);
 }
 
 // The chain's first node takes the in-edges in their order, so that phi operands still match them;

@@ -7,7 +7,8 @@
 //
 // The library only decides where a statement may move; moving and dropping are the statement
 // classes' (generatesSameCode, hoistOutOfIfElseBranch, remove), and the base classes refuse.
-// Needs: divided blocks; runs last, as it deletes the SSA edges.
+// Needs nothing of the graph's state: the walks take blocks of one item, which dividing makes of
+// every block. It deletes the SSA edges, so propagation over them cannot follow it.
 #include "ssaopt/cfg/control_flow_graph.h"
 #include "ssaopt/ir/expression.h"
 #include "ssaopt/ir/procedure.h"
@@ -50,11 +51,13 @@ bool sharesAny(const Variables& a, const Variables& b) {
 }  // namespace
 
 void KvCControlFlowGraph::hoistCodeOutOfIfElseBranches() {
+  if (!beginStep(ssaopt::GraphOperation::HoistCodeOutOfIfElseBranches)) return;
   deleteSSAEdges();
   for (node v : all_nodes()) {
     const KvCBasicBlock* pBlock = getBasicBlock(v);
     if (pBlock && pBlock->getBranchCond()) performCodeHoisting(v);
   }
+  endStep(ssaopt::GraphOperation::HoistCodeOutOfIfElseBranches);
 }
 
 // Each pass takes the next statement down each branch; the pair moves when the statements generate

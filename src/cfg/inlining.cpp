@@ -43,6 +43,7 @@ KvCCfgInitAssignment* newInitAssignment(KvCCfgVariable* pVariable, KvCCfgExpress
 // it, the square of the nesting depth in all. Meanwhile the run looks a block's procedure up through
 // the procedures inlined so far.
 void KvCControlFlowGraph::inlineProcedures() {
+  if (!beginStep(ssaopt::GraphOperation::InlineProcedures)) return;
   list<node> callBlocks = registerCalls(all_nodes());
   InliningRun run{proceduresCalledOnce(), {}};
   for (node v : callBlocks) {
@@ -51,6 +52,7 @@ void KvCControlFlowGraph::inlineProcedures() {
       if (pStatement->isProcedureCall() && inlineProcedureCalls(v, pBlock, run)) break;
   }
   if (!run.inlinedInto.empty()) settleProcedures(run);
+  endStep(ssaopt::GraphOperation::InlineProcedures);
 }
 
 // The lists are not emptied first: a call registered before, by the client or by an earlier run,

@@ -122,6 +122,7 @@ KvCCfgProcedure* KvCControlFlowGraph::newProcedure(const BxCXString& name) {
 // procedure and changes nothing. Everything else is checked before the first change, so that a
 // refusal leaves the graph as it was.
 KvCCfgProcedureCall* KvCControlFlowGraph::makeProcedureAndCall(node v) {
+  if (!beginStep(ssaopt::GraphOperation::MakeProcedureAndCall)) return nullptr;
   const KvCBasicBlock* pBlock = requireBasicBlock(v, kLineNotABlock, kLineNotABlock);
   if (!pBlock) return nullptr;
   BxCXString name = procedureNameFor(*this, v, *pBlock);
@@ -132,6 +133,7 @@ KvCCfgProcedureCall* KvCControlFlowGraph::makeProcedureAndCall(node v) {
   }
   if (!canBeSplitOff(v)) return nullptr;
   makeSingleEntry(splitOff(v, name));
+  endStep(ssaopt::GraphOperation::MakeProcedureAndCall);
   return new KvCCfgProcedureCall(name);
 }
 
@@ -268,6 +270,7 @@ node KvCControlFlowGraph::insertEmptyBlockBefore(node v) {
 // nothing.
 void KvCControlFlowGraph::setParametersOfCall(KvCCfgProcedureCall* pCall, list<KvCCfgVariable*>& formals,
                                               list<KvCCfgExpression*>& arguments) {
+  if (!beginStep(ssaopt::GraphOperation::SetParametersOfCall)) return;
   if (KvCCfgProcedure* pCallee = findProcedure(pCall->getName())) {
     list<KvCCfgParamStatement*> params = pCallee->getParamStatements();
     if (params.empty()) params = declareParameters(*pCallee, formals);
@@ -287,6 +290,7 @@ void KvCControlFlowGraph::setParametersOfCall(KvCCfgProcedureCall* pCall, list<K
 // One exit node per component, joined from every dead end of the component. A procedure that never
 // reaches its end gets an exit node without in-edges.
 void KvCControlFlowGraph::placeExitNodes() {
+  if (!beginStep(ssaopt::GraphOperation::PlaceExitNodes)) return;
   node_array<int> component;
   int count = COMPONENTS(*this, component);
   ssaopt::array<node> exitOf(static_cast<std::size_t>(count));
@@ -299,6 +303,7 @@ void KvCControlFlowGraph::placeExitNodes() {
     inf(exit)->setProcedure(pProcedure);
     pProcedure->setExitNode(exit);
   }
+  endStep(ssaopt::GraphOperation::PlaceExitNodes);
 }
 
 bool KvCControlFlowGraph::isDeadEnd(node v) const {
@@ -310,6 +315,7 @@ bool KvCControlFlowGraph::isDeadEnd(node v) const {
 // again or leaves. A body that never reaches its exit gets no such block, as nothing would enter it;
 // without "#main", its first block or its exit node there is nothing to close.
 void KvCControlFlowGraph::placeLoopAroundMain() {
+  if (!beginStep(ssaopt::GraphOperation::PlaceLoopAroundMain)) return;
   KvCCfgProcedure* pMain = findProcedure(kMainProcedureName);
   if (!pMain) return;
   KV_CONSISTENCY_CHECK(outdeg(pMain->getEntryNode()) == 1, "outdeg(EntryNode) == 1", kClassName,
@@ -322,6 +328,7 @@ void KvCControlFlowGraph::placeLoopAroundMain() {
   while (edge e = first_in_edge(exit)) move_edge(e, source(e), loop);
   new_edge(loop, first, new KvCCfgTrueBranch());
   new_edge(loop, exit, new KvCCfgFalseBranch());
+  endStep(ssaopt::GraphOperation::PlaceLoopAroundMain);
 }
 
 // ---- The function call graph ---------------------------------------------------------------------

@@ -5,8 +5,8 @@
 //            B [x2 = 1];  C [x3 = 2];  D [x4 = phi(x2, x3); y2 = x4] -> [output y2] -> X
 //   (y an output variable; operand i of a phi function belongs to the i-th in-edge of its block)
 //
-// Needs: one entry node per procedure, exit nodes placed, every call registered with the procedure
-// it calls.
+// Needs: one entry node per procedure, exit nodes placed, the start node set, every call registered
+// with the procedure it calls (transformToSSAForm refuses a graph without them).
 #include <cstddef>
 
 #include "ssaopt/cfg/control_flow_graph.h"
@@ -59,6 +59,7 @@ constexpr RenamingFault kNoVersionForValueReturn{2087, false};
 // The check points run only while internal information is shown; a failed one is reported and the
 // transformation goes on.
 void KvCControlFlowGraph::transformToSSAForm() {
+  if (!beginStep(ssaopt::GraphOperation::TransformToSSAForm)) return;
   array<KvCDominatorTree*> trees;
   collectVarDefsAndUses();
   initVariablesAfterEntryNodes();
@@ -74,6 +75,11 @@ void KvCControlFlowGraph::transformToSSAForm() {
   KV_CONSISTENCY_CHECK(checkConsistency(), "checkConsistency()", kClassName, kLineCheckAfterPhiFunctions);
   renameVariables(trees);
   freeDominatorTrees(trees, count);
+  // Phi placement asked every block for the variables it assigns; renaming has since given each
+  // definition its version, which the lists must name for the steps that build use sets from them.
+  for (node v : nodes())
+    if (KvCBasicBlock* pBlock = getBasicBlock(v)) pBlock->recomputeAssignedVariables();
+  endStep(ssaopt::GraphOperation::TransformToSSAForm);
 }
 
 // ---- Phi placement -------------------------------------------------------------------------------
@@ -98,6 +104,7 @@ list<KvCCfgVariable*> KvCControlFlowGraph::getDefinedVariables(DefinitionSites& 
 // variable that put the node on the worklist (work) and gave it a phi function (hasAlready), so that
 // nothing is cleared between variables. The placement is minimal, not pruned: liveness is not asked.
 void KvCControlFlowGraph::placePhiFunction() {
+  if (!beginStep(ssaopt::GraphOperation::PlacePhiFunction)) return;
   node_array<int> work(*this, 0);
   node_array<int> hasAlready(*this, 0);
   DefinitionSites sites;
@@ -125,6 +132,7 @@ void KvCControlFlowGraph::placePhiFunction() {
       }
     }
   }
+  endStep(ssaopt::GraphOperation::PlacePhiFunction);
 }
 
 // An exit node becomes a block the first time it needs a phi function; any other node of a frontier

@@ -7,7 +7,9 @@
 //   removeUnusedVarDefs (c.1 and y.1 erasable):
 //            z.1 = 3 * x.0; if (1) ...
 //
-// Needs the values of sparse conditional constant propagation, and for the removal divided blocks.
+// Replacing needs the values of sparse conditional constant propagation to find anything. The removal
+// needs SSA form (before it, what call arguments read is read by no block) and takes definitions only
+// from blocks that hold them alone, as dividing leaves every block.
 // What replacing and folding mean is the expressions' business; this file only decides which
 // expressions are asked, and in which order.
 #include "ssaopt/cfg/control_flow_graph.h"
@@ -57,26 +59,33 @@ bool isUnusedDefinition(KvCCfgStatement& statement, const KvCCfgVariable& variab
 
 // Phi functions and the interface statements hold no expression a constant could go into.
 void KvCControlFlowGraph::replaceConstantVariables() {
+  if (!beginStep(ssaopt::GraphOperation::ReplaceConstantVariables)) return;
   forEachAssignmentAndCondition(
       *this, [](KvCCfgAssignment& assignment) { assignment.getRHS()->replaceConstantVariables(); },
       [](KvCCfgExpression& cond) { cond.replaceConstantVariables(); });
+  endStep(ssaopt::GraphOperation::ReplaceConstantVariables);
 }
 
 void KvCControlFlowGraph::replaceConstantConditions() {
+  if (!beginStep(ssaopt::GraphOperation::ReplaceConstantConditions)) return;
   forEachAssignmentAndCondition(
       *this, [](KvCCfgAssignment&) {}, [](KvCCfgExpression& cond) { cond.replaceConstantCondition(); });
+  endStep(ssaopt::GraphOperation::ReplaceConstantConditions);
 }
 
 void KvCControlFlowGraph::foldConstants() {
+  if (!beginStep(ssaopt::GraphOperation::FoldConstants)) return;
   forEachAssignmentAndCondition(
       *this, [](KvCCfgAssignment& assignment) { assignment.foldConstants(); },
       [](KvCCfgExpression& cond) { cond.foldConstants(); });
+  endStep(ssaopt::GraphOperation::FoldConstants);
 }
 
 // The use sets are rebuilt once and then kept by hand. A definition that loses the last use of a
 // variable it reads lets that variable's definition go too: in the same pass when that comes later
 // in node order, else in the next one.
 void KvCControlFlowGraph::removeUnusedVarDefs() {
+  if (!beginStep(ssaopt::GraphOperation::RemoveUnusedVarDefs)) return;
   buildVarUses();
   bool again = true;
   while (again) {
@@ -84,6 +93,7 @@ void KvCControlFlowGraph::removeUnusedVarDefs() {
     for (node v : nodes()) removeDefinitionIfUnused(v, again);
   }
   forgetDeletedStatements();
+  endStep(ssaopt::GraphOperation::RemoveUnusedVarDefs);
 }
 
 // The block stays, emptied of its statement.

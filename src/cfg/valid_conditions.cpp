@@ -89,6 +89,7 @@ void assignComparedVariable(KvCCfgExpression& cond, KvCCfgVariable* x, const KvC
 // New blocks are placed behind the nodes of the snapshot, so a second run meets only the branches it
 // met before and adds a second layer of assignments.
 void KvCControlFlowGraph::insertValidConditionAssignments() {
+  if (!beginStep(ssaopt::GraphOperation::InsertValidConditionAssignments)) return;
   for (node v : all_nodes()) {
     KvCBasicBlock* pBlock = getBasicBlock(v);
     KvCCfgExpression* pCond = pBlock ? pBlock->getBranchCond() : nullptr;
@@ -111,6 +112,7 @@ void KvCControlFlowGraph::insertValidConditionAssignments() {
     placeOnBranch(onTrue, trueAssign);
     placeOnBranch(onFalse, falseAssign);
   }
+  endStep(ssaopt::GraphOperation::InsertValidConditionAssignments);
 }
 
 // The variable is asked for first; only a condition that is no variable is asked for a comparison.

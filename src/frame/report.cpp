@@ -19,12 +19,16 @@ StandardErrorSink g_StandardErrorSink;
 ssaopt::ReportSink* g_pSink = &g_StandardErrorSink;
 
 std::string formatHostMessage(int number, std::va_list args) {
-  if (number != kKvMessageInternalError) return "Host message " + std::to_string(number) + ".";
+  if (number != kKvMessageInternalError && number != kKvMessageInternalErrorWithDetail)
+    return "Host message " + std::to_string(number) + ".";
   const char* className = va_arg(args, const char*);
   int line = va_arg(args, int);
-  char text[256];
-  std::snprintf(text, sizeof text, "Internal error. Error code: %s%d.", className ? className : "", line);
-  return text;
+  std::string text = "Internal error. Error code: " + std::string(className ? className : "") + std::to_string(line);
+  if (number == kKvMessageInternalErrorWithDetail) {
+    const char* detail = va_arg(args, const char*);
+    text += ": " + std::string(detail ? detail : "");
+  }
+  return text + ".";
 }
 
 }  // namespace
@@ -60,9 +64,11 @@ void ReportLog::consistencyFailure(const char* file, int line, const char* condi
 }
 
 bool ReportLog::hasInternalError(const std::string& className, int line) const {
-  std::string wanted = "Internal error. Error code: " + className + std::to_string(line) + ".";
+  std::string code = "Internal error. Error code: " + className + std::to_string(line);
   for (const std::string& message : m_Messages)
-    if (message == wanted) return true;
+    if (message.compare(0, code.size(), code) == 0 && message.size() > code.size() &&
+        (message[code.size()] == '.' || message[code.size()] == ':'))
+      return true;
   return false;
 }
 
@@ -79,6 +85,10 @@ void ReportLog::clear() {
 
 void reportInternalError(const char* className, int line) {
   ERR_EmitErrorMessage(kKvErrorKindInternal, nullptr, kKvMessageInternalError, className, line);
+}
+
+void reportInternalError(const char* className, int line, const char* detail) {
+  ERR_EmitErrorMessage(kKvErrorKindInternal, nullptr, kKvMessageInternalErrorWithDetail, className, line, detail);
 }
 
 void reportConsistencyFailure(const char* file, int line, const char* condition) {

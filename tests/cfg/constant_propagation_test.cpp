@@ -66,6 +66,7 @@ INSTANTIATE_TEST_SUITE_P(, Conditions,
 TEST(ConstantPropagationOwnership, FreesEveryReplacedValueObjectExactlyOnce) {
   Var x("x");
   auto* pGraph = new KvCControlFlowGraph();
+  pGraph->setState(kBuiltInSSAForm);
   KvCCfgProcedure* pMain = nullptr;
   node entry = pGraph->demandProcedureEntryNode(KvCControlFlowGraph::kMainProcedureName, pMain);
   auto *x1 = new KvCSSAVariable(&x), *x2 = new KvCSSAVariable(&x);

@@ -65,8 +65,14 @@ inline KvCPhiFunction* phiFunction(KvCCfgVariable* pVariable, const std::vector<
   return pPhi;
 }
 
+// The graphs are built in SSA form and divided by hand, and say so.
+inline constexpr ssaopt::GraphState kBuiltInSSAForm{ssaopt::GraphFact::ExitsPlaced, ssaopt::GraphFact::SSAForm,
+                                                    ssaopt::GraphFact::Divided};
+
 class PropagationTest : public cfgtest::CfgTest {
 protected:
+  PropagationTest() { G.setState(kBuiltInSSAForm); }
+
   // A new SSA version of `variable`.
   static KvCSSAVariable* version(KvCCfgVariable& variable) { return new KvCSSAVariable(&variable); }
   static Sum* sum(double constant, std::vector<KvCCfgVariable*> reads = {}) {

@@ -30,8 +30,8 @@ TEST_F(Building, CallsAreRegisteredOnceWhenAskedAndPassTheirArgumentsToTheParame
   KvCControlFlowGraph& graph = pProgram->graph();
   KvCCfgProcedure* pAccumulate = graph.findProcedure("accumulate");
   EXPECT_TRUE(pAccumulate->getCalls().empty());
-  pProgram->completeCallLists();
-  pProgram->completeCallLists();
+  pProgram->graph().completeCallLists();
+  pProgram->graph().completeCallLists();
   std::vector<KvCCfgProcedureCall*> calls = callsIn(*pProgram);
   ASSERT_EQ(calls.size(), 3u);
   EXPECT_EQ(pAccumulate->getCalls(), (ssaopt::list<KvCCfgProcedureCall*>{calls[0], calls[1]}));

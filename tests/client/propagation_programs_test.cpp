@@ -27,7 +27,7 @@ protected:
   }
 
   static void toDividedSSA(ssaopt::client::Program& program) {
-    program.completeCallLists();
+    program.graph().completeCallLists();
     program.graph().transformToSSAForm();
     program.transformKeepingLabels([&program] { program.graph().divideBasicBlock(); });
   }

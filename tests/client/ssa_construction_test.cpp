@@ -32,7 +32,7 @@ TEST_F(SSAConstruction, TheFormerExitKeepsItsInEdgesAndDominatesTheNewExit) {
       "  x = 1;\n"
       "}\n");
   ASSERT_NE(pProgram, nullptr);
-  pProgram->completeCallLists();
+  pProgram->graph().completeCallLists();
   KvCControlFlowGraph& G = pProgram->graph();
   G.transformToSSAForm();
   ssaopt::node exit = G.findProcedure("maybe")->getExitNode();

@@ -1,6 +1,7 @@
 // The default pipeline's printed result on every example and on the benchmark programs of 10^3 and
-// 10^4 statements in both shapes must stay exactly what was recorded in expected/. Running the test
-// with SSAOPT_UPDATE_GOLDEN=1 records the current results instead (for a deliberate change of them).
+// 10^4 statements in both shapes must stay exactly what was recorded in expected/, and the library's
+// verifier must pass after every step. Running the test with SSAOPT_UPDATE_GOLDEN=1 records the
+// current results instead (for a deliberate change of them).
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -12,12 +13,13 @@
 #include <string>
 #include <vector>
 
-#include "passes.h"
 #include "program_shapes.h"
 #include "ssaopt/client/front_end.h"
+#include "ssaopt/client/pipeline.h"
 #include "ssaopt/client/printer.h"
 #include "ssaopt/frame/control.h"
 #include "ssaopt/frame/pool.h"
+#include "ssaopt/frame/report.h"
 #include "ssaopt/ir/edge_info.h"
 #include "ssaopt/ir/expression.h"
 #include "ssaopt/ir/node_info.h"
@@ -59,31 +61,58 @@ std::vector<GoldenCase> goldenCases() {
   return cases;
 }
 
+// The client's part in every step, and the library's verifier after it.
+class VerifiedSteps : public ssaopt::client::ProgramSteps {
+public:
+  using ProgramSteps::ProgramSteps;
+  void runStep(const ssaopt::PipelineStep& step, KvCControlFlowGraph& graph) override {
+    ProgramSteps::runStep(step, graph);
+    if (!graph.verify()) failedAfter += std::string(failedAfter.empty() ? "" : ", ") + step.name;
+  }
+
+  std::string failedAfter;
+};
+
+struct PipelineResult {
+  std::string printed;
+  std::string verifierFailedAfter;
+  std::vector<std::string> reports;
+};
+
 // What `ssaopt FILE` prints: the program after the default pipeline.
-std::string runDefaultPipeline(const std::string& text) {
+PipelineResult runDefaultPipeline(const std::string& text) {
   // Numbered from 0, as in a run of the tool, so that block names match.
   ssaopt::client::restartObjectNumbering();
   ssaopt::PoolMemController pool;
   ssaopt::PoolMemController::Scope use(&pool);
   KvCSSAControl control;
   control.boot();
-  std::string printed;
+  PipelineResult result;
   {
+    ssaopt::ReportLog log;
     ssaopt::client::LoadResult loaded = ssaopt::client::loadProgram(text);
     if (loaded.program) {
-      ssaopt::tool::runPipeline(ssaopt::tool::defaultPipeline(), *loaded.program);
-      printed = ssaopt::client::printProgram(*loaded.program);
+      VerifiedSteps steps(*loaded.program);
+      ssaopt::runTypicalRun(loaded.program->graph(), steps);
+      result.printed = ssaopt::client::printProgram(*loaded.program);
+      result.verifierFailedAfter = steps.failedAfter;
     }
+    result.reports = log.messages();
+    for (const ssaopt::ReportLog::Consistency& failure : log.consistencyFailures())
+      result.reports.push_back(failure.condition);
   }
   control.shutdown();
-  return printed;
+  return result;
 }
 
 class GoldenOutput : public testing::TestWithParam<GoldenCase> {};
 
 TEST_P(GoldenOutput, PipelineResultIsUnchanged) {
-  std::string printed = runDefaultPipeline(GetParam().program);
+  PipelineResult result = runDefaultPipeline(GetParam().program);
+  const std::string& printed = result.printed;
   ASSERT_FALSE(printed.empty()) << "the front end rejected the program";
+  EXPECT_EQ(result.verifierFailedAfter, "") << "the verifier failed after these steps";
+  EXPECT_EQ(result.reports, std::vector<std::string>());
   fs::path expected = fs::path(SSAOPT_GOLDEN_DIR) / (GetParam().name + ".txt");
   const char* update = std::getenv("SSAOPT_UPDATE_GOLDEN");
   if (update && std::string(update) == "1") {

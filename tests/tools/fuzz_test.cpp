@@ -135,4 +135,14 @@ TEST(ToolFuzz, MisusesAreCommandLineErrors) {
   }
 }
 
+// A failure must reproduce from its seed alone: the same seed draws the same order, one that can run.
+TEST(ToolFuzz, TheSameSeedDrawsTheSameLegalPassOrder) {
+  for (std::uint64_t seed : {1u, 2u, 77u}) {
+    std::vector<std::string> pipeline = ssaopt::tool::randomLegalPipeline(seed, 16);
+    EXPECT_EQ(pipeline, ssaopt::tool::randomLegalPipeline(seed, 16));
+    EXPECT_LE(pipeline.size(), 16u);
+    EXPECT_EQ(ssaopt::tool::findPipelineError(pipeline), "") << ssaopt::tool::joinedPassNames(pipeline);
+  }
+}
+
 }  // namespace

@@ -3,7 +3,8 @@
 // statement naming its procedure, never an edge into it. Nodes carry KvCCfgNodeInfo payloads (blocks,
 // entries, exits) and edges KvCCfgEdgeInfo payloads (plain, true and false branches, SSA edges).
 //
-// Invariants that every transformation keeps (checkConsistency verifies the first three):
+// Invariants that every transformation keeps (checkConsistency verifies the first three, verify all
+// of them and those of SSA form):
 //   1. each procedure occupies exactly one connected component, edge directions ignored;
 //   2. its entry node is the only node of that component without in-edges;
 //   3. every node of the component has the procedure as its payload's procedure;
@@ -18,12 +19,25 @@
 // The members are grouped by concern, one source file each (src/cfg/).
 #pragma once
 
+#include <functional>
+
+#include "ssaopt/cfg/graph_state.h"
 #include "ssaopt/frame/containers.h"
 #include "ssaopt/frame/graph.h"
 #include "ssaopt/frame/string.h"
 #include "ssaopt/ir/edge_info.h"
 #include "ssaopt/ir/forward.h"
 #include "ssaopt/ir/node_info.h"
+
+namespace ssaopt {
+
+// A procedure and its blocks in program order (KvCControlFlowGraph::getProgramOrder).
+struct ProcedureBlocks {
+  KvCCfgProcedure* pProcedure;
+  array<node> blocks;
+};
+
+}  // namespace ssaopt
 
 class KvCControlFlowGraph : public ssaopt::GRAPH<KvCCfgNodeInfo*, KvCCfgEdgeInfo*> {
 public:
@@ -57,6 +71,51 @@ public:
   // the result).
   bool checkConsistency() const;
 
+  // ---- The graph's state and its verifier (step_checks.cpp, verifier.cpp) ---------------------
+
+  // Which steps have run, as far as the steps rely on it (see graph_state.h). Every public step
+  // checks it on entry and keeps it up to date.
+  ssaopt::GraphState getState() const { return m_State; }
+  // For a client that builds the graph in a later form by hand (already in SSA form, already
+  // divided): the steps take its word for it.
+  void setState(ssaopt::GraphState state) { m_State = state; }
+  // Why `operation` cannot run on the graph now, naming the step and what is missing; empty when it
+  // can. A step called anyway reports this as an internal error and changes nothing.
+  BxCXString checkReadiness(ssaopt::GraphOperation operation) const;
+  // Checks the six invariants above and, in SSA form, that every version has one definition, that
+  // every use is dominated by its definition (an argument at its call, a value return at the
+  // callee's exit), that every phi function has one operand per control-flow in-edge of its block
+  // (of the first block of its chain once divided), that SSA out-edges follow the control-flow
+  // out-edges, and that use sets match the statements where the steps keep them. Reports every
+  // violation as a failed consistency condition, whatever ShowInternalInfo() says, and returns
+  // whether there was none. Near-linear in the size of the graph; changes nothing.
+  bool verify() const;
+
+  // ---- Reading the graph back (reading.cpp) ----------------------------------------------------
+
+  // Whether `e` is control flow: not an SSA edge.
+  bool isControlFlowEdge(ssaopt::edge e) const {
+    KvCCfgEdgeInfo* pInfo = inf(e);
+    return !pInfo || !pInfo->isSSAEdge();
+  }
+  // The control-flow out-edges and in-edges of `v`, in adjacency order.
+  ssaopt::array<ssaopt::edge> getControlFlowOutEdges(ssaopt::node v) const;
+  ssaopt::array<ssaopt::edge> getControlFlowInEdges(ssaopt::node v) const;
+  // The node whose control-flow in-edges the operands of the phi functions of `v` belong to: `v`
+  // itself, or after divideBasicBlock the first node of the chain of one-phi blocks that `v` lies
+  // on (its blocks may since have been emptied by removeUnusedVarDefs). Costs the length of the
+  // chain before `v`.
+  ssaopt::node getPhiChainHead(ssaopt::node v) const;
+  // The in-edges that the operands of the phi functions of `v` belong to, in operand order.
+  ssaopt::array<ssaopt::edge> getPhiOperandEdges(ssaopt::node v) const;
+  // Every procedure with its blocks in program order: procedures in the order of their entry nodes;
+  // within one, its first block, then chains of blocks in node order, each block followed by the
+  // block it falls into when nothing else enters that one (so the pieces of a divided or split block
+  // stay together, and a join stays where the client put it). Only blocks for which `isShown` is
+  // true take part (all when it is empty); a chain ends before any other.
+  ssaopt::array<ssaopt::ProcedureBlocks> getProgramOrder(
+      const std::function<bool(ssaopt::node)>& isShown = nullptr) const;
+
   // ---- Block surgery (graph.cpp) ---------------------------------------------------------------
 
   // Splits the block of `v` so that `pStatement` begins a new block, which takes over the out-edges;
@@ -87,6 +146,9 @@ public:
   void placeExitNodes();
   // Closes "#main" into a loop, so that analyses see it executed again and again.
   void placeLoopAroundMain();
+  // Appends every call of the graph that no procedure's call list holds yet to its procedure's list,
+  // so that each call is registered before transformToSSAForm, which needs them all (call_lists.cpp).
+  void completeCallLists();
 
   // ---- SSA construction and the optimisations join here, each in a source file of its own ------
 
@@ -164,6 +226,14 @@ private:
   // Class name and file of the internal error and consistency reports.
   static constexpr const char* kClassName = "KvCControlFlowGraph";
 
+  // ---- The graph's state (step_checks.cpp) and its verifier (verifier.cpp) ---------------------
+
+  // True when the graph is ready for `operation`; otherwise reports why and returns false.
+  bool beginStep(ssaopt::GraphOperation operation);
+  // The facts that `operation` sets and clears.
+  void endStep(ssaopt::GraphOperation operation) { m_State = ssaopt::stateAfter(operation, m_State); }
+  class Verifier;
+
   // ---- Shared mechanism (graph.cpp) ------------------------------------------------------------
 
   // Reports the consistency condition "0" and the internal error at `line`: a case that a
@@ -224,7 +294,10 @@ private:
 
   // Immediate dominators of one component, given as its nodes in node order.
   void computeIdomsFast(const ssaopt::array<ssaopt::node>& nodes, LengauerTarjan& dominators,
-                        ssaopt::node_array<ssaopt::node>& idom);
+                        ssaopt::node_array<ssaopt::node>& idom) const;
+  // The immediate dominator of every node over control-flow edges, as computeAllIdoms finds it,
+  // without giving it to the payloads.
+  void computeControlFlowIdoms(ssaopt::node_array<ssaopt::node>& idom) const;
   // One tree per component, in component numbering, rooted at the component's entry node; returns
   // the number of trees. freeDominatorTrees deletes them again.
   int buildDominatorTrees(ssaopt::array<KvCDominatorTree*>& trees);
@@ -317,6 +390,7 @@ private:
 
   ssaopt::node m_StartNode;
   ProcedureTable m_Procedures;
+  ssaopt::GraphState m_State;
   // Absent entries read as false.
   ssaopt::node_array<bool> m_Visited;
   // Reached-marks for the walks of makeProcedureAndCall: all false between walks, so that a walk
@@ -420,6 +494,10 @@ private:
   void removeOperands(ssaopt::node link, KvCPhiFunction& phi, const ssaopt::array<int>& positions);
   void destroyDeadBlock(ssaopt::node n);
   bool isDividedBlockLink(ssaopt::edge e) const;
+  // A link of a chain of phi functions: a divided-block link between blocks holding one phi function
+  // or, once removeUnusedVarDefs has taken it away, nothing (reading.cpp).
+  bool isPhiChainLink(ssaopt::edge e) const;
+  bool holdsPhiFunctionOrNothing(ssaopt::node v) const;
 
   // The edges that divideBasicBlock made between the pieces of one block. The operand removal walks
   // a chain of phi nodes along these only, never on into the next block.

@@ -13,10 +13,13 @@ class KvCSrcRef;
 enum : int {
   kKvErrorKindInternal = 3,     // kind of an internal error
   kKvMessageInternalError = 7,  // "Internal error. Error code: %s%d."
+  // The same with what went wrong: "Internal error. Error code: %s%d: %s."
+  kKvMessageInternalErrorWithDetail = 8,
 };
 
 // Emits host message `number` of `kind`. Message 7 takes the reporting class's name (const char*)
-// and a source line (int) and reads "Internal error. Error code: <class><line>.".
+// and a source line (int) and reads "Internal error. Error code: <class><line>."; message 8 takes a
+// text (const char*) after them and reads "Internal error. Error code: <class><line>: <text>.".
 void ERR_EmitErrorMessage(int kind, const KvCSrcRef* source, int number, ...);
 
 // The internal-information switch: consistency checks run only while it is true.
@@ -61,7 +64,8 @@ public:
   const std::vector<Consistency>& consistencyFailures() const { return m_Consistency; }
   bool empty() const { return m_Messages.empty() && m_Consistency.empty(); }
   std::size_t count() const { return m_Messages.size() + m_Consistency.size(); }
-  // True when an internal error with this class name and line ("KvCPhiFunction", 93) was reported.
+  // True when an internal error with this class name and line ("KvCPhiFunction", 93) was reported,
+  // with or without a text.
   bool hasInternalError(const std::string& className, int line) const;
   // True when the consistency condition with this text failed.
   bool hasConsistencyFailure(const std::string& condition) const;
@@ -76,6 +80,8 @@ private:
 // Reports the host's internal error for a case that a consistent graph never reaches: kind 3,
 // message 7, the reporting class name and source line.
 void reportInternalError(const char* className, int line);
+// The same with a text that says what went wrong (message 8).
+void reportInternalError(const char* className, int line, const char* detail);
 
 // Reports a failed internal consistency condition (file, line, condition text).
 void reportConsistencyFailure(const char* file, int line, const char* condition);

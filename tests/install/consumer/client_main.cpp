@@ -12,9 +12,8 @@
 
 #include <ssaopt/client/c_emitter.h>
 #include <ssaopt/client/front_end.h>
-#include <ssaopt/client/hoisting.h>
-#include <ssaopt/client/inlining.h>
 #include <ssaopt/client/interpreter.h>
+#include <ssaopt/client/pipeline.h>
 #include <ssaopt/client/printer.h>
 #include <ssaopt/ssaopt.h>
 
@@ -45,20 +44,6 @@ clamp:
 }
 )";
 
-void runTypicalPipeline(ssaopt::client::Program& program) {
-  ssaopt::client::inlineProcedures(program);
-  program.graph().insertValidConditionAssignments();
-  program.completeCallLists();
-  program.graph().transformToSSAForm();
-  program.transformKeepingLabels([&program] { program.graph().divideBasicBlock(); });
-  program.graph().propagateSparseConditionalConstant(true);
-  program.graph().replaceConstantVariables();
-  program.graph().replaceConstantConditions();
-  program.graph().foldConstants();
-  program.graph().removeUnusedVarDefs();
-  ssaopt::client::hoistCodeOutOfIfElseBranches(program);
-}
-
 bool fail(const char* what) {
   std::fprintf(stderr, "client_consumer: %s\n", what);
   return false;
@@ -68,7 +53,8 @@ bool transformAndCheck() {
   std::unique_ptr<ssaopt::client::Program> original = ssaopt::client::loadProgram(kProgram).program;
   std::unique_ptr<ssaopt::client::Program> transformed = ssaopt::client::loadProgram(kProgram).program;
   if (!original || !transformed) return fail("the program does not load");
-  runTypicalPipeline(*transformed);
+  if (!ssaopt::client::runTypicalRun(*transformed)) return fail("a step of the typical run was refused");
+  if (!transformed->graph().verify()) return fail("the verifier found the graph broken");
   ssaopt::client::CheckReport report =
       ssaopt::client::checkBehaviour(*original, *transformed, ssaopt::client::CheckSettings());
   if (report.difference) return fail(ssaopt::client::formatReport(report).c_str());

@@ -54,6 +54,9 @@ public:
   // Sub-expressions that the value arithmetic decides without the variables they read (all-literal
   // ones, and those such as 0 * x) become literals, unless they read a volatile variable.
   void foldConstants() override;
+  // The terms that foldConstants leaves, without changing the expression; setTerms puts them in.
+  Terms foldedTerms() const;
+  void setTerms(Terms terms) { m_Terms = std::move(terms); }
   // x, or !x with `negated` set.
   KvCCfgVariable* isVariable(bool& negated) const override;
   // x == c, c == x, x != c or c != x.
@@ -67,10 +70,14 @@ public:
   const Terms& getTerms() const { return m_Terms; }
   // A new expression with the same terms, owned by the same store.
   KvCCfgSFExpression* clone() const;
-  // Would be emitted as the same C text: the same terms, SSA versions read as their variables.
+  // Would be emitted as the same C text and computes the same value: the same terms, reading the same
+  // SSA versions (as hoisting will leave them, see versionReadAfterHoisting).
   bool generatesSameCodeAs(const KvCCfgSFExpression& other) const;
   // The element write a[i] = e, whose last term names the array.
   bool isElementWrite() const;
+  // The number of the literal that the terms of an expression store, as a whole or as the value of an
+  // element write; null where they store anything else.
+  static double* storedLiteral(Terms& terms);
 
 private:
   friend class ssaopt::client::ExpressionStore;

@@ -10,8 +10,8 @@
 //      deleted: the calls it places are the real ones, split off into blocks of their own);
 //   5. placeExitNodes, placeLoopAroundMain, and the start node at the entry of "#main".
 //
-// Calls are not registered in their procedures' call lists here: Program::completeCallLists does that
-// before the SSA transformation, unless inlining already did.
+// Calls are not registered in their procedures' call lists here: the graph's completeCallLists does
+// that before the SSA transformation (the pipeline's "ssa" step), unless inlining already did.
 //
 // The graph it hands over keeps the invariants the library relies on: blocks that cannot be reached
 // from their procedure's entry are dropped (with a warning naming them), every procedure reaches its

@@ -14,20 +14,29 @@
 // is: the program is then merely not improved.
 #pragma once
 
+#include <functional>
+
 #include "ssaopt/client/program.h"
 
 class KvCCfgSFAssignment;
 
 namespace ssaopt::client {
 
-// The library's hoistCodeOutOfIfElseBranches, listening to the assignments, then the moves they
-// agreed to.
-void hoistCodeOutOfIfElseBranches(Program& program);
+// Runs `hoistStep` (the library's hoistCodeOutOfIfElseBranches) listening to the assignments, then
+// makes the moves they agreed to.
+void hoistAsAgreed(Program& program, const std::function<void()>& hoistStep);
 
 // The assignments' side of the hooks. While the step listens, agreeToHoist notes the statement and
 // agrees, and noteDroppedTwin notes the twin of the statement agreed last; otherwise the one refuses
 // and the other does nothing.
 bool agreeToHoist(KvCCfgSFAssignment* pHoisted);
 void noteDroppedTwin(KvCCfgSFAssignment* pTwin);
+
+// What a read of `pVariable` reads once the moves agreed so far are made: the hoisted statement's
+// version where `pVariable` is the version of a dropped twin, else `pVariable` itself. Two statements
+// generate the same code only where they read the same versions in this sense: twins that read
+// different versions (the virtual versions that the two branches of a condition give one variable)
+// compute different values, and the hoisted one could read a version defined after it.
+KvCCfgVariable* versionReadAfterHoisting(KvCCfgVariable* pVariable);
 
 }  // namespace ssaopt::client

@@ -3,10 +3,13 @@
 // assignments in front of the inlined body.
 #pragma once
 
+#include <functional>
+
 #include "ssaopt/client/program.h"
 
 namespace ssaopt::client {
 
-void inlineProcedures(Program& program);
+// Runs `inlineStep` (the library's inlineProcedures) and moves the labels of inlined call blocks.
+void inlineKeepingLabels(Program& program, const std::function<void()>& inlineStep);
 
 }  // namespace ssaopt::client

@@ -60,11 +60,6 @@ public:
   void setMainLoopCondition(KvCCfgExpression* pCondition) { m_pMainLoopCondition = pCondition; }
   KvCCfgExpression* mainLoopCondition() const { return m_pMainLoopCondition; }
 
-  // Registers, in its procedure's call list, every call of the graph that is not registered yet, so
-  // that each call is registered exactly once before the SSA transformation. Inlining registers the
-  // calls it meets itself; the front end registers none, so that inlining sees each call once.
-  void completeCallLists();
-
 private:
   std::vector<std::unique_ptr<KvCCfgSFVariable>> m_Variables;
   std::unordered_map<std::string_view, KvCCfgSFVariable*> m_VariablesByName;
