@@ -5,6 +5,7 @@
 
 #include "exit_status.h"
 #include "passes.h"
+#include "program_check.h"
 #include "ssaopt/client/front_end.h"
 #include "ssaopt/client/interpreter.h"
 #include "ssaopt/frame/control.h"
@@ -41,17 +42,29 @@ private:
     return kSuccess;
   }
 
+  // The behaviour before and after the pipeline, and what each constant propagation of the pipeline
+  // claims, checked on the same runs right after it.
   int check(const std::vector<std::string>& pipeline) {
     std::unique_ptr<client::Program> pOriginal = load({}, true);
     if (!pOriginal) return kFailure;
-    std::unique_ptr<client::Program> pTransformed = load(pipeline, false);
+    std::unique_ptr<client::Program> pTransformed = load({}, false);
     client::CheckSettings settings;
     settings.runs = m_Options.runs.value_or(kDefaultRuns);
     settings.firstSeed = m_Options.seed.value_or(kDefaultSeed);
     settings.limits.steps = m_Options.steps.value_or(kDefaultSteps);
+    std::string propagation;  // the last propagation's report, or the first contradiction
+    bool contradicted = false;
+    for (const std::string& name : pipeline) {
+      runPipeline({name}, *pTransformed);
+      if (contradicted || !propagatesConstants(name)) continue;
+      client::PropagationReport oracle = client::checkPropagation(*pTransformed, settings);
+      contradicted = oracle.violation.has_value();
+      propagation =
+          (contradicted ? "after pass " + name + ", " : "") + client::formatPropagationReport(oracle);
+    }
     client::CheckReport report = client::checkBehaviour(*pOriginal, *pTransformed, settings);
-    m_Out << client::formatReport(report);
-    return report.difference ? kFailure : kSuccess;
+    m_Out << client::formatReport(report) << propagation;
+    return report.difference || contradicted ? kFailure : kSuccess;
   }
 
   std::unique_ptr<client::Program> load(const std::vector<std::string>& pipeline, bool showWarnings) {

@@ -7,6 +7,7 @@
 #include <filesystem>
 #include <fstream>
 #include <iostream>
+#include <new>
 #include <string>
 #include <vector>
 
@@ -89,5 +90,11 @@ int main(int argc, char** argv) {
     return ssaopt::tool::kSuccess;
   }
   ssaopt::client::setDiagnosticColours(wantsColours(options.colour));
-  return dispatch(options);
+  // The one exception anything throws: running out of memory, wherever it happens, ends the run.
+  try {
+    return dispatch(options);
+  } catch (const std::bad_alloc&) {
+    std::cerr << "ssaopt: out of memory\n";
+    return ssaopt::tool::kFailure;
+  }
 }

@@ -101,7 +101,32 @@ bool captureOutput(const std::string& command, std::string& output) {
   return pclose(pipe.release()) == 0;
 }
 
+// The other process runs with other allocator settings, so that its objects lie elsewhere and in
+// another order: glibc serves blocks of 4 KB and more from mmap instead of the heap, and fills
+// allocated and freed memory with a byte pattern. A result that follows addresses, or reads memory
+// never written, then differs.
+constexpr const char* kOtherAllocator = "GLIBC_TUNABLES=glibc.malloc.mmap_threshold=4096 MALLOC_PERTURB_=165";
+
+// Both processes print the values and ranges too: a front end reads them, and they follow the order
+// in which propagation merged what it found.
+client::PrintOptions printedResult() {
+  client::PrintOptions options;
+  options.showValues = true;
+  return options;
+}
+
+// The settings of the runs of each program: the seeds and limits of the behaviour check.
+client::CheckSettings runSettings() {
+  client::CheckSettings settings;
+  settings.runs = kRunsPerProgram;
+  return settings;
+}
+
 }  // namespace
+
+bool propagatesConstants(const std::string& name) {
+  return name == "sccp" || name == "sccp-keep-dead" || name == "propagate" || name == "propagate-keep-dead";
+}
 
 ProgramCheck::ProgramCheck(std::vector<std::string> pipeline, std::string tool)
     : m_Pipeline(std::move(pipeline)), m_Tool(std::move(tool)) {}
@@ -119,47 +144,55 @@ Problem ProgramCheck::findProblem(const std::string& text, bool checkDeterminism
   // objects between this load and printing the result.
   client::restartObjectNumbering();
   std::unique_ptr<client::Program> pTransformed = client::loadProgram(text).program;
-  std::vector<PrintedSource> sources;
-  std::string reports = transform(*pTransformed, sources);
-  if (!reports.empty()) return {ProblemKind::Report, reports};
-  std::string printed = client::printProgram(*pTransformed);
-  for (const PrintedSource& source : sources) {
+  Transformation transformation = transform(*pTransformed);
+  if (!transformation.reports.empty()) return {ProblemKind::Report, transformation.reports};
+  std::string printed = client::printProgram(*pTransformed, printedResult());
+  for (const PrintedSource& source : transformation.sources) {
     std::string problem = roundTripProblem(source.text, source.after);
     if (!problem.empty()) return {ProblemKind::RoundTrip, problem};
   }
-  client::CheckSettings settings;
-  settings.runs = kRunsPerProgram;
-  client::CheckReport report = client::checkBehaviour(*original.program, *pTransformed, settings);
+  if (!transformation.contradiction.empty()) return {ProblemKind::Propagation, transformation.contradiction};
+  client::CheckReport report = client::checkBehaviour(*original.program, *pTransformed, runSettings());
   if (report.difference) return {ProblemKind::Behaviour, client::formatReport(report)};
   return checkDeterminism ? findDeterminismProblem(text, printed) : Problem();
 }
 
-std::string ProgramCheck::transform(client::Program& program, std::vector<PrintedSource>& sources) const {
+ProgramCheck::Transformation ProgramCheck::transform(client::Program& program) const {
+  Transformation result;
   Verification verification;
   verification.checkGraph(program.graph(), "the front end");
-  sources.push_back({"the front end", client::printProgram(program)});
+  result.sources.push_back({"the front end", client::printProgram(program)});
   bool printable = true;
   for (const std::string& name : m_Pipeline) {
     runPipeline({name}, program);
     verification.checkGraph(program.graph(), "pass " + name);
     printable = printable && !leavesTheFormat(name);
-    if (printable) sources.push_back({"pass " + name, client::printProgram(program)});
+    if (printable) result.sources.push_back({"pass " + name, client::printProgram(program)});
+    if (propagatesConstants(name) && result.contradiction.empty()) {
+      client::PropagationReport oracle = client::checkPropagation(program, runSettings());
+      if (oracle.violation)
+        result.contradiction = "after pass " + name + ", " + formatPropagationReport(oracle);
+    }
   }
   std::ostringstream reports;
   verification.writeReports(reports);
-  return reports.str();
+  result.reports = reports.str();
+  return result;
 }
 
 Problem ProgramCheck::findDeterminismProblem(const std::string& text, const std::string& printed) const {
   TemporaryFile file(text);
   std::string other;
-  if (file.path().empty() ||
-      !captureOutput(m_Tool + passesOption() + " " + file.path() + " 2>/dev/null", other))
+  if (file.path().empty() || !captureOutput(otherProcessCommand(file.path()) + " 2>/dev/null", other))
     return {ProblemKind::Determinism, "another process could not optimise the program\n"};
   if (other != printed)
     return {ProblemKind::Determinism,
             "another process printed a different result\n" + firstDifference(printed, other)};
   return {};
+}
+
+std::string ProgramCheck::otherProcessCommand(const std::string& path) const {
+  return std::string(kOtherAllocator) + " " + m_Tool + " --show-values" + passesOption() + " " + path;
 }
 
 std::string ProgramCheck::passesOption() const {
@@ -170,9 +203,11 @@ std::string ProgramCheck::reproduceCommand(ProblemKind kind, const std::string& 
   std::string passes = passesOption();
   switch (kind) {
     case ProblemKind::Behaviour:
+    case ProblemKind::Propagation:
       return "ssaopt check " + path + passes;
     case ProblemKind::Determinism:
-      return "for i in 1 2; do ssaopt" + passes + " " + path + " > out$i.ssa; done; cmp out1.ssa out2.ssa";
+      return "ssaopt --show-values" + passes + " " + path + " > out1.ssa; " + kOtherAllocator +
+             " ssaopt --show-values" + passes + " " + path + " > out2.ssa; cmp out1.ssa out2.ssa";
     case ProblemKind::RoundTrip:
       return "ssaopt --print-after-all" + passes + " " + path + " (read back each printed program)";
     default:

@@ -1,6 +1,5 @@
 // Variables and procedures as declared: every check that needs nothing but the declarations.
 #include <cmath>
-#include <limits>
 #include <string>
 
 #include "front_end_steps.h"
@@ -11,8 +10,10 @@ namespace ssaopt::client::detail {
 
 namespace {
 
-// Arrays are indexed by the 32-bit integer view of their index.
-constexpr double kMaxArrayLength = std::numeric_limits<std::int32_t>::max();
+// The largest array a program may declare. Controller code holds tables of a few thousand entries;
+// the interpreter and the emitted C keep every element (8 bytes in the interpreter), so a length up to
+// the 32-bit index range would need 16 GB for one array.
+constexpr double kMaxArrayLength = 1 << 20;
 
 std::string quoted(std::string_view text) { return "'" + std::string(text) + "'"; }
 

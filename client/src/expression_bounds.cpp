@@ -4,7 +4,6 @@
 // can still be optimistic about it.
 #include <algorithm>
 #include <cmath>
-#include <cstdint>
 #include <initializer_list>
 #include <vector>
 
@@ -22,6 +21,10 @@ struct Interval {
 };
 
 const KvCCfgValue kUnbounded(eCfgNonConstant);
+
+// The values of a 32-bit integer, which every integer operator gives.
+constexpr double kInt32Lowest = -2147483648.0;
+constexpr double kInt32Highest = 2147483647.0;
 
 // The bound computed from `inputs`: non-constant if any is, undetermined if any is, else the number
 // `compute` gives from them, where a NaN means that nothing is known.
@@ -124,14 +127,28 @@ Interval unaryInterval(TermOp op, const Interval& a) {
   }
 }
 
+// Whether the end may be the infinity it leans to: open, or that infinity. An end not known yet is
+// taken as a number, as optimistically as its other uses.
+bool mayBeInfinite(const KvCCfgValue& end) {
+  return end.isNonConstant() || (end.isConstant() && std::isinf(end.getValue()));
+}
+
+// Opposite infinities added give NaN, which lies in no interval: the sum is then bounded nowhere. The
+// ends alone do not show it: [-inf, 0] + [0, inf] has the ends -inf and inf.
+Interval sumInterval(const Interval& a, const Interval& b) {
+  if ((mayBeInfinite(a.lo) && mayBeInfinite(b.hi)) || (mayBeInfinite(a.hi) && mayBeInfinite(b.lo)))
+    return {kUnbounded, kUnbounded};
+  return {boundFrom({a.lo, b.lo}, [&] { return a.lo.getValue() + b.lo.getValue(); }),
+          boundFrom({a.hi, b.hi}, [&] { return a.hi.getValue() + b.hi.getValue(); })};
+}
+
 Interval binaryInterval(TermOp op, const Interval& a, const Interval& b) {
   switch (op) {
     case TermOp::Add:
-      return {boundFrom({a.lo, b.lo}, [&] { return a.lo.getValue() + b.lo.getValue(); }),
-              boundFrom({a.hi, b.hi}, [&] { return a.hi.getValue() + b.hi.getValue(); })};
+      return sumInterval(a, b);
     case TermOp::Subtract:
-      return {boundFrom({a.lo, b.hi}, [&] { return a.lo.getValue() - b.hi.getValue(); }),
-              boundFrom({a.hi, b.lo}, [&] { return a.hi.getValue() - b.lo.getValue(); })};
+      return sumInterval(a, {boundFrom({b.hi}, [&] { return -b.hi.getValue(); }),
+                             boundFrom({b.lo}, [&] { return -b.lo.getValue(); })});
     case TermOp::Multiply:
       return cornerInterval(a, b, [](double x, double y) { return x * y; });
     case TermOp::Divide:
@@ -145,15 +162,15 @@ bool isPoint(const Interval& a) {
   return a.lo.isConstant() && a.hi.isConstant() && a.lo.getValue() == a.hi.getValue();
 }
 
-// The integer operators have no exact interval rule: with every operand known exactly, the result is
-// known exactly; otherwise it is some 32-bit integer.
+// The integer operators have no exact interval rule: their result is a 32-bit integer, known exactly
+// where every operand is.
 Interval operatorInterval(TermOp op, const Interval* operands, int arity) {
   if (ssaopt::client::givesTruthValue(op)) return {KvCCfgValue(0.0), KvCCfgValue(1.0)};
   if (ssaopt::client::isIntegerOperator(op)) {
-    if (isPoint(operands[0]) && (arity == 1 || isPoint(operands[1])))
-      return point(arity == 1 ? ssaopt::client::applyUnary(op, operands[0].lo)
-                              : ssaopt::client::applyBinary(op, operands[0].lo, operands[1].lo));
-    return {KvCCfgValue(static_cast<double>(INT32_MIN)), KvCCfgValue(static_cast<double>(INT32_MAX))};
+    bool exact = isPoint(operands[0]) && (arity == 1 || isPoint(operands[1]));
+    if (!exact) return {KvCCfgValue(kInt32Lowest), KvCCfgValue(kInt32Highest)};
+    return point(arity == 1 ? ssaopt::client::applyUnary(op, operands[0].lo)
+                            : ssaopt::client::applyBinary(op, operands[0].lo, operands[1].lo));
   }
   return arity == 1 ? unaryInterval(op, operands[0]) : binaryInterval(op, operands[0], operands[1]);
 }
@@ -177,6 +194,7 @@ std::vector<KvCCfgSFExpression::Bounds> KvCCfgSFExpression::getTermBounds(bool s
   std::vector<Bounds> bounds;
   bounds.reserve(m_Terms.size());
   std::vector<Interval> stack;
+  stack.reserve(m_Terms.size());
   for (const Term& term : m_Terms) {
     int arity = ssaopt::client::arityOf(term.op);
     Interval result;

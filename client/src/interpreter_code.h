@@ -3,6 +3,7 @@
 // the graph, a set or a name.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -20,7 +21,7 @@ inline constexpr std::uint32_t kNoNode = UINT32_MAX;
 // A variable of the program: `length` numbers of the memory from `base`, one for a scalar.
 struct Slot {
   const KvCCfgSFVariable* pVariable;
-  std::uint32_t base;
+  std::size_t base;
   std::uint32_t length;
   bool isArray;
   bool isVolatile;
@@ -34,10 +35,15 @@ struct Term {
 };
 using Code = std::vector<Term>;
 
+// The SSA version a definition of a scalar that is neither volatile nor an array defines, for the
+// observer of a run; null for any other definition.
+using Observed = KvCCfgVariable*;
+
 // x = e. A whole array takes the value in every element.
 struct StoreOp {
   std::uint32_t slot;
   Code value;
+  Observed pVersion;
 };
 
 // a[i] = e, whose code ends in the element write.
@@ -63,6 +69,15 @@ struct ParamOp {
   std::uint32_t formal;
   std::unordered_map<const KvCCfgProcedureCall*, std::optional<Code>> arguments;
   std::string name;  // of the formal, for the fault of a call without argument
+  Observed pVersion;
+};
+
+// A definition that computes nothing (a phi function, a value return, a virtual assignment): its
+// version is what the variable holds where it stands. Only the observer sees it, and it does not
+// count as a statement executed.
+struct DefineOp {
+  std::uint32_t slot;
+  Observed pVersion;
 };
 
 struct ExternOp {
@@ -76,7 +91,7 @@ struct FaultOp {
   std::string message;
 };
 
-using Op = std::variant<StoreOp, ElementStoreOp, CallOp, ParamOp, ExternOp, FaultOp>;
+using Op = std::variant<StoreOp, ElementStoreOp, CallOp, ParamOp, ExternOp, FaultOp, DefineOp>;
 
 // How control leaves a node once its operations ran.
 enum class Flow {
@@ -88,7 +103,8 @@ enum class Flow {
 };
 
 struct NodeCode {
-  std::string name;  // "bb7", "entry of f", for faults
+  ssaopt::node origin;  // the node of the graph
+  std::string name;     // "bb7", "entry of f", for faults
   std::vector<Op> ops;
   Flow flow = Flow::Fault;
   std::uint32_t next = kNoNode;

@@ -31,19 +31,28 @@ constexpr double kElementOutsideArray = 0.0;
 
 class Machine {
 public:
-  Machine(const ProgramCode& code, const RunLimits& limits, InputStreams& inputs)
-      : m_Code(code), m_Limits(limits), m_Inputs(inputs), m_Memory(code.initialMemory) {}
+  Machine(const ProgramCode& code, const RunLimits& limits, InputStreams& inputs, RunObserver* pObserver)
+      : m_Code(code),
+        m_Limits(limits),
+        m_Inputs(inputs),
+        m_pObserver(pObserver),
+        m_Memory(code.initialMemory) {}
 
   Trace run() {
     if (m_Code.start == kNoNode) fault("the program has no start node");
     m_Node = m_Code.start;
     while (!m_Ended) {
+      const NodeCode& node = m_Code.nodes[m_Node];
+      // What only the observer sees is no statement: it leaves the count and the guard alone.
+      if (m_NextOp < node.ops.size() && std::holds_alternative<DefineOp>(node.ops[m_NextOp])) {
+        execute(std::get<DefineOp>(node.ops[m_NextOp++]));
+        continue;
+      }
       if (++m_Trace.statements - m_StatementsBeforeStep > m_Limits.maxStatementsPerStep) {
         end(Ending::StatementLimit,
             "more than " + std::to_string(m_Limits.maxStatementsPerStep) + " statements in one step");
         break;
       }
-      const NodeCode& node = m_Code.nodes[m_Node];
       if (m_NextOp < node.ops.size())
         std::visit([this](const auto& op) { execute(op); }, node.ops[m_NextOp++]);
       else
@@ -84,7 +93,9 @@ private:
         return;
       case Flow::Branch: {
         double condition = 0.0;
-        if (evaluate(node.condition, condition)) follow(node, condition != 0.0);
+        if (!evaluate(node.condition, condition)) return;
+        if (m_pObserver) m_pObserver->branched(node.origin, condition != 0.0, currentStep());
+        follow(node, condition != 0.0);
         return;
       }
       case Flow::MainLoop:
@@ -133,7 +144,16 @@ private:
 
   void execute(const StoreOp& op) {
     double value = 0.0;
-    if (evaluate(op.value, value)) store(op.slot, value);
+    if (!evaluate(op.value, value)) return;
+    store(op.slot, value);
+    tellDefined(op.pVersion, op.slot);
+  }
+
+  void execute(const DefineOp& op) { tellDefined(op.pVersion, op.slot); }
+
+  void tellDefined(Observed pVersion, std::uint32_t slot) {
+    if (m_pObserver && pVersion)
+      m_pObserver->defined(*pVersion, m_Memory[m_Code.slots[slot].base], currentStep());
   }
 
   void execute(const ElementStoreOp& op) {
@@ -172,7 +192,11 @@ private:
       return;
     }
     double value = 0.0;
-    if (found->second && evaluate(*found->second, value)) store(op.formal, value);
+    if (found->second) {
+      if (!evaluate(*found->second, value)) return;
+      store(op.formal, value);
+    }
+    tellDefined(op.pVersion, op.formal);
   }
 
   void execute(const ExternOp& op) {
@@ -225,7 +249,7 @@ private:
   }
 
   // The memory index of element `index` of the array in `slot`; none outside the array.
-  std::optional<std::uint32_t> element(std::uint32_t slot, double index) const {
+  std::optional<std::size_t> element(std::uint32_t slot, double index) const {
     const Slot& array = m_Code.slots[slot];
     std::int32_t i = ssaopt::integerView(index);
     if (i < 0 || static_cast<std::uint32_t>(i) >= array.length) return std::nullopt;
@@ -234,13 +258,13 @@ private:
 
   bool readElement(std::uint32_t slot, double index, double& value) {
     if (m_Code.slots[slot].isVolatile) return input(m_Code.slots[slot], value);
-    std::optional<std::uint32_t> at = element(slot, index);
+    std::optional<std::size_t> at = element(slot, index);
     value = at ? m_Memory[*at] : kElementOutsideArray;
     return true;
   }
 
   void writeElement(std::uint32_t slot, double index, double value) {
-    std::optional<std::uint32_t> at = element(slot, index);
+    std::optional<std::size_t> at = element(slot, index);
     if (at) m_Memory[*at] = storedValue(*m_Code.slots[slot].pVariable, value);
   }
 
@@ -299,6 +323,7 @@ private:
   const ProgramCode& m_Code;
   const RunLimits& m_Limits;
   InputStreams& m_Inputs;
+  RunObserver* m_pObserver;
   std::vector<double> m_Memory;
   std::vector<double> m_Stack;
   std::vector<double> m_Arguments;
@@ -321,8 +346,8 @@ Interpreter::Interpreter(const Program& program)
 
 Interpreter::~Interpreter() = default;
 
-Trace Interpreter::run(const RunLimits& limits, InputStreams& inputs) const {
-  return detail::Machine(*m_pCode, limits, inputs).run();
+Trace Interpreter::run(const RunLimits& limits, InputStreams& inputs, RunObserver* pObserver) const {
+  return detail::Machine(*m_pCode, limits, inputs, pObserver).run();
 }
 
 }  // namespace ssaopt::client

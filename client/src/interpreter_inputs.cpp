@@ -72,10 +72,22 @@ Domain floatDomain(const KvCCfgSFVariable& variable) {
   return Domain{false, low, high};
 }
 
+// The type's values within the saturation limits (all of them where the limits leave none).
+Domain integerDomain(const KvCCfgSFVariable& variable) {
+  Domain domain{true, *typeMinimum(variable.getDataType()), *typeMaximum(variable.getDataType())};
+  double low = variable.isLowerBorderSaturated() ? std::ceil(variable.getLowerLimit()) : domain.low;
+  double high = variable.isUpperBorderSaturated() ? std::floor(variable.getUpperLimit()) : domain.high;
+  if (std::max(low, domain.low) <= std::min(high, domain.high)) {
+    domain.low = std::max(low, domain.low);
+    domain.high = std::min(high, domain.high);
+  }
+  return domain;
+}
+
 Domain domainOf(const KvCCfgSFVariable& variable) {
   if (isFloatType(variable.getDataType())) return floatDomain(variable);
   if (variable.isScaled()) return scaledDomain(variable);
-  return Domain{true, std::ceil(*declaredLowerBound(variable)), std::floor(*declaredUpperBound(variable))};
+  return integerDomain(variable);
 }
 
 double uniformIn(const Domain& domain, std::uint64_t random) {

@@ -50,8 +50,8 @@ private:
   void allocateSlots() {
     for (const std::unique_ptr<KvCCfgSFVariable>& pVariable : m_Program.variables()) {
       bool isArray = pVariable->isArray();
-      Slot slot{pVariable.get(), static_cast<std::uint32_t>(m_Code.initialMemory.size()),
-                isArray ? pVariable->getArrayLength() : 1, isArray, pVariable->isVolatile()};
+      Slot slot{pVariable.get(), m_Code.initialMemory.size(), isArray ? pVariable->getArrayLength() : 1,
+                isArray, pVariable->isVolatile()};
       double initial = storedValue(*pVariable, pVariable->getInitValue()->getValue());
       m_Code.initialMemory.insert(m_Code.initialMemory.end(), slot.length, initial);
       std::uint32_t index = static_cast<std::uint32_t>(m_Code.slots.size());
@@ -72,7 +72,8 @@ private:
   Code lowerExpression(KvCCfgExpression* pExpression) const {
     if (!pExpression) throw Unrunnable("an expression is missing");
     if (KvCCfgSFExpression* pTerms = pExpression->isSFExpression()) return lowerTerms(*pTerms);
-    if (auto* pMembers = dynamic_cast<KvCCfgVariableExpression*>(pExpression)) return lowerMember(*pMembers);
+    if (KvCCfgVariableExpression* pMembers = pExpression->isVariableExpression())
+      return lowerMember(*pMembers);
     KvCCfgValue value = pExpression->evaluate();
     if (!dynamic_cast<KvCCfgValueExpression*>(pExpression) || !value.isConstant())
       throw Unrunnable("an expression has no value");
@@ -106,7 +107,7 @@ private:
 
   // The summaries' parameter statements pass each variable to itself: `formal` keeps its value.
   bool passesItself(std::uint32_t formal, KvCCfgExpression* pArgument) const {
-    auto* pMembers = dynamic_cast<KvCCfgVariableExpression*>(pArgument);
+    KvCCfgVariableExpression* pMembers = pArgument ? pArgument->isVariableExpression() : nullptr;
     if (!pMembers) return false;
     ssaopt::set<KvCCfgVariable*> members = pMembers->getUsedVariables();
     return members.size() == 1 && slotOf(*members.begin()) == formal;
@@ -115,24 +116,29 @@ private:
   // ---- Statements --------------------------------------------------------------------------------
 
   void lowerStatements(const KvCBasicBlock& block, NodeCode& code) const {
-    for (KvCCfgStatement* pStatement : block.getStatementSeq()) {
-      if (!runs(*pStatement)) continue;
-      try {
-        code.ops.push_back(lowerStatement(*pStatement));
-      } catch (const Unrunnable& problem) {
-        code.ops.push_back(FaultOp{code.name + ": " + problem.what()});
-      }
+    for (KvCPhiFunction* pPhi : block.getPhiFunctions()) lowerInto(code, *pPhi);
+    for (KvCCfgStatement* pStatement : block.getStatementSeq())
+      if (!pStatement->isOutputStatement()) lowerInto(code, *pStatement);
+  }
+
+  void lowerInto(NodeCode& code, KvCCfgStatement& statement) const {
+    try {
+      Op op = lowerStatement(statement);
+      const DefineOp* pDefinition = std::get_if<DefineOp>(&op);
+      if (!pDefinition || pDefinition->pVersion) code.ops.push_back(std::move(op));
+    } catch (const Unrunnable& problem) {
+      code.ops.push_back(FaultOp{code.name + ": " + problem.what()});
     }
   }
 
-  // Phi functions, value-return statements, output statements and virtual assignments generate no
-  // code: every version already stands in its variable's slot.
-  static bool runs(KvCCfgStatement& statement) {
-    return !statement.getIsVirtual() && !statement.isPhiFunction() && !statement.isValueReturnStatement() &&
-           !statement.isOutputStatement();
+  // Phi functions, value-return statements and virtual assignments generate no code: every version
+  // already stands in its variable's slot.
+  static bool computesNothing(KvCCfgStatement& statement) {
+    return statement.getIsVirtual() || statement.isPhiFunction() || statement.isValueReturnStatement();
   }
 
   Op lowerStatement(KvCCfgStatement& statement) const {
+    if (computesNothing(statement)) return lowerDefinition(statement);
     if (KvCCfgParamStatement* pParam = statement.isParamStatement()) return lowerParam(*pParam);
     if (KvCCfgAssignment* pAssignment = statement.isAssignment()) return lowerAssignment(*pAssignment);
     if (KvCCfgProcedureCall* pCall = statement.isProcedureCall()) return lowerCall(*pCall);
@@ -144,7 +150,33 @@ private:
     KvCCfgSFExpression* pTerms = assignment.getRHS() ? assignment.getRHS()->isSFExpression() : nullptr;
     if (pTerms && pTerms->isElementWrite()) return ElementStoreOp{lowerTerms(*pTerms)};
     if (!assignment.getLHS()) throw Unrunnable("an assignment without left-hand side");
-    return StoreOp{slotOf(assignment.getLHS()), lowerExpression(assignment.getRHS())};
+    std::uint32_t slot = slotOf(assignment.getLHS());
+    return StoreOp{slot, lowerExpression(assignment.getRHS()), observed(slot, assignment.getLHS())};
+  }
+
+  // Nothing to observe (a null version) where the statement defines no variable of the program.
+  DefineOp lowerDefinition(KvCCfgStatement& statement) const {
+    KvCCfgVariable* pDefined = definedVariable(statement);
+    auto found = pDefined ? m_SlotOf.find(originalOf(pDefined)) : m_SlotOf.end();
+    if (found == m_SlotOf.end()) return DefineOp{0, nullptr};
+    return DefineOp{found->second, observed(found->second, pDefined)};
+  }
+
+  // The one variable each kind of statement that computes nothing defines.
+  static KvCCfgVariable* definedVariable(KvCCfgStatement& statement) {
+    if (KvCPhiFunction* pPhi = statement.isPhiFunction()) return pPhi->getVariable();
+    if (KvCCfgValueReturnStatement* pReturn = statement.isValueReturnStatement())
+      return pReturn->getVariable();
+    KvCCfgAssignment* pAssignment = statement.isAssignment();
+    return pAssignment ? pAssignment->getLHS() : nullptr;
+  }
+
+  // What the observer of a run is told of: SSA versions of plain scalars, whose values stay in their
+  // slot until the next definition.
+  Observed observed(std::uint32_t slot, KvCCfgVariable* pDefined) const {
+    const Slot& variable = m_Code.slots[slot];
+    bool plain = !variable.isArray && !variable.isVolatile;
+    return plain && pDefined->isSSAVariable() ? pDefined : nullptr;
   }
 
   Op lowerCall(KvCCfgProcedureCall& call) const {
@@ -167,7 +199,8 @@ private:
   }
 
   Op lowerParam(const KvCCfgParamStatement& param) const {
-    ParamOp op{slotOf(param.getVariable()), {}, variableName(param.getVariable())};
+    std::uint32_t formal = slotOf(param.getVariable());
+    ParamOp op{formal, {}, variableName(param.getVariable()), observed(formal, param.getVariable())};
     for (const auto& [pCall, pArgument] : param.getArguments())
       op.arguments.emplace(pCall, passesItself(op.formal, pArgument)
                                       ? std::nullopt
@@ -196,6 +229,7 @@ private:
 
   NodeCode lowerNode(node v) const {
     NodeCode code;
+    code.origin = v;
     KvCCfgNodeInfo* pInfo = m_Graph.inf(v);
     if (!pInfo) {
       code.fault = "a node without payload";

@@ -55,17 +55,16 @@ void fillWith(list<KvCCfgValue*>& values, const ssaopt::array<KvCCfgVariable*>& 
   for (KvCCfgVariable* pOperand : operands) *slot++ = of(pOperand);
 }
 
-// The cast to the variable's type wraps a bound that leaves the type's range (an int8 in [0, 100]
-// plus 100 gives [100, -56]); a wrapped range claims too little, so the variable gets no range.
-void dropInvertedRange(KvCCfgVariable& variable) {
-  const KvCCfgValue* pMin = variable.getMinValue();
-  const KvCCfgValue* pMax = variable.getMaxValue();
-  if (!pMin || !pMax || !pMin->isConstant() || !pMax->isConstant()) return;
-  if (pMin->getValue() <= pMax->getValue()) return;
-  KvCCfgValue unknown(eCfgNonConstant);
-  variable.setMinValueAndDestroyOld(unknown);
-  variable.setMaxValueAndDestroyOld(unknown);
-}
+// A parameter statement as its formal holds it once it ran for some call: each argument already
+// stored as the call stores it (KvCCfgParamStatement::evaluateHeld), so the visit stores the result as
+// it is.
+struct HeldByFormal {
+  const KvCCfgParamStatement& statement;
+
+  KvCCfgValue evaluate() const { return statement.evaluateHeld(); }
+  KvCCfgValue getMinimum() const { return statement.getHeldMinimum(); }
+  KvCCfgValue getMaximum() const { return statement.getHeldMaximum(); }
+};
 
 // The value and range of a variable before a visit, to tell whether the visit changed any of them. Bit
 // for bit: -0.0 after +0.0 compares equal as a value of the lattice, yet prints differently.
@@ -323,7 +322,8 @@ void KvCControlFlowGraph::visitAssignment(KvCCfgAssignment* pAssignment, node v,
 void KvCControlFlowGraph::visitParamStatement(KvCCfgParamStatement* pStatement, node v,
                                               list<edge>& cfgWorkList, list<edge>& ssaWorkList,
                                               bool& changed) {
-  visitDefinition(pStatement->getVariable(), *pStatement, v, cfgWorkList, ssaWorkList, changed, true);
+  visitDefinition(pStatement->getVariable(), HeldByFormal{*pStatement}, v, cfgWorkList, ssaWorkList, changed,
+                  false);
 }
 
 void KvCControlFlowGraph::visitValueReturnStatement(KvCCfgValueReturnStatement* pStatement, node v,
@@ -347,7 +347,7 @@ void KvCControlFlowGraph::visitDefinition(KvCCfgVariable* pVariable, const Defin
     pVariable->setVarValueAndAdjustCfgValue(value);
   else
     pVariable->setVarValue(value);
-  recordRange(pVariable, definition);
+  recordRange(pVariable, definition, stores);
   if (!before.matches(*pVariable)) unsettleDefinitionAt(v);
   if (pOld->compare(value) != 0) {
     if (pOld->isUndetermined() && value.isConstant()) changed = true;
@@ -357,15 +357,17 @@ void KvCControlFlowGraph::visitDefinition(KvCCfgVariable* pVariable, const Defin
   delete pOld;
 }
 
-// The minimum is stored before the maximum is computed: a definition that reads its own variable
-// (a recursive call passing a parameter on) sees the new value in both bounds.
+// The two bounds are fitted together: a type that wraps between them (an int8 in [0, 100] plus 100)
+// holds its whole range, not the wrapped ends. A value return passes on a range that its variable
+// already holds.
 template <class Definition>
-void KvCControlFlowGraph::recordRange(KvCCfgVariable* pVariable, const Definition& definition) {
+void KvCControlFlowGraph::recordRange(KvCCfgVariable* pVariable, const Definition& definition, bool stores) {
   KvCCfgValue minimum = definition.getMinimum();
-  pVariable->setMinValueAndDestroyOld(minimum);
   KvCCfgValue maximum = definition.getMaximum();
-  pVariable->setMaxValueAndDestroyOld(maximum);
-  dropInvertedRange(*pVariable);
+  if (stores)
+    pVariable->setVarRangeAndAdjust(minimum, maximum);
+  else
+    pVariable->setVarRange(minimum, maximum);
 }
 
 // A constant comparing equal to 0.0 takes the false edge, every other constant the true edge;
@@ -387,8 +389,8 @@ void KvCControlFlowGraph::visitBranchCondition(KvCCfgExpression* pCond, node v, 
 // still undetermined leaves the meet alone. Nothing is scheduled: the uses are reached by the flow
 // step or in the next pass. Unlike an assignment, any change to a constant asks for another pass.
 // A join of thousands of edges is merged again on every one of them that becomes executable, so the
-// merge reuses one list for the values and the two bounds. The operands hold values their
-// definitions already adjusted to the variable, so the meet is stored as it is.
+// merge reuses one list for the values and the two bounds. The operands hold values and ranges
+// their definitions already adjusted to the variable, so the meet and the hull are stored as they are.
 void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node v, bool& changed) {
   KvCCfgVariable* pVariable = pPhi->getVariable();
   DefinitionSnapshot before(*pVariable);
@@ -402,11 +404,10 @@ void KvCControlFlowGraph::visitPhiFunction(KvCPhiFunction* pPhi, node v, bool& c
   fillWith(merged, operands,
            [](KvCCfgVariable* pOperand) { return boundOf(pOperand->getMinValue(), *pOperand); });
   KvCCfgValue minimum = determineMinimum(merged);
-  pVariable->setMinValueAndDestroyOld(minimum);
   fillWith(merged, operands,
            [](KvCCfgVariable* pOperand) { return boundOf(pOperand->getMaxValue(), *pOperand); });
   KvCCfgValue maximum = determineMaximum(merged);
-  pVariable->setMaxValueAndDestroyOld(maximum);
+  pVariable->setVarRange(minimum, maximum);
   if (!before.matches(*pVariable)) unsettleDefinitionAt(v);
   delete pOld;
 }

@@ -85,6 +85,7 @@ private:
 
 // Deleting the node in hand is all that happens to the node list, so the live view serves.
 bool KvCControlFlowGraph::eliminateDeadCode() {
+  keepExitsAttached();
   bool removedOperand = false;
   ParameterReads parameterReads;
   for (node n : nodes()) {
@@ -104,6 +105,42 @@ bool KvCControlFlowGraph::eliminateDeadCode() {
 
 // Entry and exit nodes stay, reached or not.
 bool KvCControlFlowGraph::isDeadBlock(node v) const { return !isVisited(v) && getBasicBlock(v); }
+
+// A procedure that the constants never let end (a loop whose condition stays true) would lose every
+// path to its exit node with the dead blocks, and the exit would stand apart from its procedure,
+// which the graph's consistency forbids. One edge from a reached block into the dead ones, which no
+// run takes, is bent to the exit instead: "if 1 goto spin else end". It keeps its place among the
+// out-edges of its source, so its branch stays what it was.
+void KvCControlFlowGraph::keepExitsAttached() {
+  ssaopt::array<KvCCfgProcedure*> cutOff;
+  for (const auto& named : m_Procedures)
+    if (named.second->getExitNode() && losesEveryInEdge(named.second->getExitNode()))
+      cutOff.push_back(named.second);
+  if (cutOff.empty()) return;
+  ssaopt::map<KvCCfgProcedure*, edge> intoDeadCode = firstEdgesIntoDeadCode();
+  for (KvCCfgProcedure* pProcedure : cutOff)
+    if (const edge* pEdge = intoDeadCode.lookup(pProcedure))
+      move_edge(*pEdge, source(*pEdge), pProcedure->getExitNode());
+}
+
+bool KvCControlFlowGraph::losesEveryInEdge(node v) const {
+  for (edge e : in(v))
+    if (!inf(e)->isSSAEdge() && !isDeadBlock(source(e))) return false;
+  return true;
+}
+
+// Per procedure, the first control-flow edge in node order that leads from a reached node to a dead
+// block.
+ssaopt::map<KvCCfgProcedure*, edge> KvCControlFlowGraph::firstEdgesIntoDeadCode() const {
+  ssaopt::map<KvCCfgProcedure*, edge> first;
+  for (node v : nodes()) {
+    if (!isDeadBlock(v)) continue;
+    KvCCfgProcedure* pProcedure = inf(v)->getProcedure();
+    for (edge e : in(v))
+      if (!inf(e)->isSSAEdge() && !isDeadBlock(source(e)) && !first.lookup(pProcedure)) first[pProcedure] = e;
+  }
+  return first;
+}
 
 // The first node of a chain may have lost its phi function to removeUnusedVarDefs while the later
 // ones keep theirs, whose operands still follow its in-edges.

@@ -22,6 +22,8 @@ bool KvCCfgExpression::hasSideEffects() const { return false; }
 
 KvCCfgSFExpression* KvCCfgExpression::isSFExpression() { return nullptr; }
 
+KvCCfgVariableExpression* KvCCfgExpression::isVariableExpression() { return nullptr; }
+
 KvCCfgValue KvCCfgValueExpression::evaluate() const {
   return isMarkedAsEvalToNonConst() ? KvCCfgValue(eCfgNonConstant) : m_Value;
 }

@@ -8,6 +8,8 @@
 #include "ssaopt/frame/control.h"
 #include "ssaopt/frame/report.h"
 #include "ssaopt/ir/expression.h"
+#include "ssaopt/ir/variable.h"
+#include "ssaopt/ir/variable_expression.h"
 #include "ssaopt/values/arithmetic.h"
 
 namespace {
@@ -26,18 +28,45 @@ ssaopt::set<KvCCfgVariable*> usedVariablesOf(const KvCCfgExpression* pExpression
   return pExpression ? pExpression->getUsedVariables() : ssaopt::set<KvCCfgVariable*>();
 }
 
-// Asks every argument that is there the same question and combines the answers with one of the list
-// merges. No argument at all gives the merge of an empty list, which is undetermined.
-template <class Combine>
-KvCCfgValue combineArguments(const KvCCfgParamStatement::Arguments& arguments,
-                             KvCCfgValue (KvCCfgExpression::*ask)() const, Combine combine) {
+// Asks every argument that is there what `ask` gives for it and combines the answers with one of the
+// list merges. No argument at all gives the merge of an empty list, which is undetermined.
+template <class Ask, class Combine>
+KvCCfgValue combineArguments(const KvCCfgParamStatement::Arguments& arguments, Ask ask, Combine combine) {
   ssaopt::array<KvCCfgValue> values;
   values.reserve(arguments.size());
   for (const auto& entry : arguments)
-    if (entry.second) values.push_back((entry.second->*ask)());
+    if (entry.second) values.push_back(ask(*entry.second));
   ssaopt::list<KvCCfgValue*> pointers;
   for (KvCCfgValue& value : values) pointers.push_back(&value);
   return combine(pointers);
+}
+
+template <KvCCfgValue (KvCCfgExpression::*question)() const>
+KvCCfgValue asked(KvCCfgExpression& argument) {
+  return (argument.*question)();
+}
+
+KvCCfgVariable* originalOf(KvCCfgVariable* pVariable) {
+  KvCSSAVariable* pVersion = pVariable->isSSAVariable();
+  return pVersion ? pVersion->getOrigVar() : pVariable;
+}
+
+// The summaries pass a variable that a procedure reads on to it as the variable itself: the call
+// stores nothing, and the formal keeps the value it holds.
+bool passesHeldValue(KvCCfgExpression& argument, KvCCfgVariable& formal) {
+  KvCCfgVariableExpression* pMembers = argument.isVariableExpression();
+  if (!pMembers) return false;
+  for (KvCCfgVariable* pMember : pMembers->getUsedVariables())
+    if (originalOf(pMember) != originalOf(&formal)) return false;
+  return true;
+}
+
+// One bound of the range the formal holds after `argument`: the argument's range fitted to the formal
+// as a pair, unless the formal already holds it.
+KvCCfgValue heldBound(KvCCfgExpression& argument, KvCCfgVariable& formal, bool lower) {
+  KvCCfgValue minimum = argument.getMinimum(), maximum = argument.getMaximum();
+  if (!passesHeldValue(argument, formal)) formal.fitRange(minimum, maximum);
+  return lower ? minimum : maximum;
 }
 
 }  // namespace
@@ -124,15 +153,37 @@ KvCCfgExpression* KvCCfgParamStatement::getArgument(KvCCfgProcedureCall* pCall) 
 }
 
 KvCCfgValue KvCCfgParamStatement::evaluate() const {
-  return combineArguments(m_Arguments, &KvCCfgExpression::evaluate, intersect);
+  return combineArguments(m_Arguments, asked<&KvCCfgExpression::evaluate>, intersect);
 }
 
 KvCCfgValue KvCCfgParamStatement::getMinimum() const {
-  return combineArguments(m_Arguments, &KvCCfgExpression::getMinimum, determineMinimum);
+  return combineArguments(m_Arguments, asked<&KvCCfgExpression::getMinimum>, determineMinimum);
 }
 
 KvCCfgValue KvCCfgParamStatement::getMaximum() const {
-  return combineArguments(m_Arguments, &KvCCfgExpression::getMaximum, determineMaximum);
+  return combineArguments(m_Arguments, asked<&KvCCfgExpression::getMaximum>, determineMaximum);
+}
+
+KvCCfgValue KvCCfgParamStatement::evaluateHeld() const {
+  KvCCfgVariable& formal = *m_pVariable;
+  auto held = [&formal](KvCCfgExpression& argument) {
+    KvCCfgValue value = argument.evaluate();
+    if (!passesHeldValue(argument, formal)) formal.adjustCfgValue(value);
+    return value;
+  };
+  return combineArguments(m_Arguments, held, intersect);
+}
+
+KvCCfgValue KvCCfgParamStatement::getHeldMinimum() const {
+  KvCCfgVariable& formal = *m_pVariable;
+  auto held = [&formal](KvCCfgExpression& argument) { return heldBound(argument, formal, true); };
+  return combineArguments(m_Arguments, held, determineMinimum);
+}
+
+KvCCfgValue KvCCfgParamStatement::getHeldMaximum() const {
+  KvCCfgVariable& formal = *m_pVariable;
+  auto held = [&formal](KvCCfgExpression& argument) { return heldBound(argument, formal, false); };
+  return combineArguments(m_Arguments, held, determineMaximum);
 }
 
 ssaopt::set<KvCCfgVariable*> KvCCfgValueReturnStatement::getUsedVariables() const {

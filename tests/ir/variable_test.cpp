@@ -1,4 +1,6 @@
 // Variables: adjusting values to what a variable can hold, SSA versions, aliases and uses.
+#include <limits>
+#include <string>
 #include <type_traits>
 
 #include "doubles.h"
@@ -81,6 +83,80 @@ TEST(SSAVariable, AVersionOfAVersionLeadsToTheOriginalAndTakesTheMarksOfItsSourc
   KvCSSAVariable third(&first);
   third.setMaxValueAndDestroyOld(fraction);
   EXPECT_VALUE(*third.getMaxValue(), nonConstant);
+}
+
+namespace {
+
+// The range `version` holds after values in [minimum, maximum] were assigned to it, as "[lo, hi]".
+std::string fitted(KvCSSAVariable& version, const KvCCfgValue& minimum, const KvCCfgValue& maximum) {
+  KvCCfgValue lower = minimum, upper = maximum;
+  version.setVarRangeAndAdjust(lower, upper);
+  return "[" + ::testing::PrintToString(*version.getMinValue()) + ", " +
+         ::testing::PrintToString(*version.getMaxValue()) + "]";
+}
+
+std::string fitted(KvCSSAVariable& version, double minimum, double maximum) {
+  return fitted(version, constant(minimum), constant(maximum));
+}
+
+}  // namespace
+
+// Storing a value saturates it beyond a saturated border, else converts it, and an integer type
+// wraps: the range held is what storing every value between the bounds gives, not the bounds stored.
+TEST(SSAVariableRange, BothBoundsAreFittedTogetherAsStoringTheValuesBetweenThemGives) {
+  TestVariable byte(KV_DataType::int8()), clipped(KV_DataType::int8()), wide(KV_DataType::int8());
+  clipped.saturate(-1e300, 20.0);
+  wide.saturate(-300.0, 300.0);
+  KvCSSAVariable b(&byte), c(&clipped), w(&wide);
+  EXPECT_EQ(fitted(b, 100, 200), "[constant -128, constant 127]");
+  EXPECT_EQ(fitted(b, 200, 300), "[constant -56, constant 44]");
+  EXPECT_EQ(fitted(b, nonConstant, constant(5)), "[constant -128, constant 127]");
+  EXPECT_EQ(fitted(b, undetermined, constant(5)), "[undetermined, constant 127]");
+  KvCCfgValue lower = constant(100), upper = constant(200);
+  byte.fitRange(lower, upper);  // in place, storing nothing
+  EXPECT_VALUE(lower, constant(-128));
+  EXPECT_VALUE(upper, constant(127));
+  EXPECT_EQ(fitted(c, 0, 200), "[constant 0, constant 20]");
+  EXPECT_EQ(fitted(c, -200, -100), "[constant -128, constant 127]");  // wraps below the limit
+  EXPECT_EQ(fitted(w, 0, 400), "[constant -128, constant 300]");      // the limit is kept exactly
+
+  KV_Scaling coarse(0.3, 0.0);
+  TestVariable scaled(KV_DataType::int16(), &coarse);
+  scaled.saturate(-1e300, 100.1);
+  KvCSSAVariable s(&scaled);
+  double roundedUp = KvCScaleTool::findRepresentedValue(100.1, &coarse);  // 334 steps: above the limit
+  EXPECT_GT(roundedUp, 100.1);
+  fitted(s, 0, 200);
+  EXPECT_VALUE(*s.getMaxValue(), constant(roundedUp));
+  EXPECT_EQ(fitted(s, nonConstant, constant(200)).rfind("[non-constant, constant 100.2", 0), 0u);
+  // Values bounded by a number on no side may be NaN, which the scaling keeps and saturation does not
+  // clamp; an integer type stores NaN as 0.
+  EXPECT_EQ(fitted(s, nonConstant, nonConstant), "[non-constant, non-constant]");
+  const double nan = std::numeric_limits<double>::quiet_NaN();
+  EXPECT_EQ(fitted(s, nan, nan), "[non-constant, non-constant]");
+  EXPECT_EQ(fitted(s, undetermined, nonConstant), "[undetermined, non-constant]");
+  EXPECT_EQ(fitted(b, nan, nan), "[constant -128, constant 127]");
+
+  TestVariable real;
+  KvCSSAVariable r(&real);
+  const double infinity = std::numeric_limits<double>::infinity();
+  EXPECT_EQ(fitted(r, nonConstant, constant(5)), "[non-constant, constant 5]");
+  EXPECT_EQ(fitted(r, infinity, infinity), "[constant inf, constant inf]");  // a value, not an open end
+
+  real.markAsVolatile();
+  KvCSSAVariable input(&real);
+  EXPECT_EQ(fitted(input, 0, 1), "[non-constant, non-constant]");
+}
+
+// A phi function's or value return's bounds are those of values the variable already holds; fitting
+// them again would wrap the kept limit 300 of an int8.
+TEST(SSAVariableRange, ARangeAlreadyHeldIsStoredAsItIs) {
+  TestVariable wide(KV_DataType::int8());
+  wide.saturate(-300.0, 300.0);
+  KvCSSAVariable w(&wide);
+  w.setVarRange(constant(-128), constant(300));
+  EXPECT_VALUE(*w.getMinValue(), constant(-128));
+  EXPECT_VALUE(*w.getMaxValue(), constant(300));
 }
 
 TEST(VariableUses, CountAllUsesCountsANodeSharedWithAnAliasTwice) {

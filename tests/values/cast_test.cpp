@@ -85,4 +85,62 @@ TEST(Cast, ChangesOnlyTheNumberOfTheGivenValue) {
   EXPECT_VALUE(unconverted, constant(2.7));
 }
 
+// ---- Ranges ----------------------------------------------------------------------------------------
+
+struct RangeCase {
+  const KV_DataType* type;
+  double minimum, maximum;
+  double castMinimum, castMaximum;
+};
+
+void expectRanges(std::initializer_list<RangeCase> cases, bool normaliseBool = false) {
+  for (const RangeCase& c : cases) {
+    double minimum = c.minimum, maximum = c.maximum;
+    castRange(c.type, minimum, maximum, normaliseBool);
+    EXPECT_EQ(minimum, c.castMinimum) << c.type->getName() << " [" << c.minimum << ", " << c.maximum << "]";
+    EXPECT_EQ(maximum, c.castMaximum) << c.type->getName() << " [" << c.minimum << ", " << c.maximum << "]";
+  }
+}
+
+// Casting each end alone claims too little: an int16 in [-32768, 32768] was cast to [-32768, -32768].
+TEST(CastRange, AnIntegerTypeThatWrapsInsideTheRangeGivesItsWholeRange) {
+  const KV_DataType *i32 = KV_DataType::int32(), *i16 = KV_DataType::int16(), *i8 = KV_DataType::int8();
+  const KV_DataType* u8 = KV_DataType::uint8();
+  expectRanges({{i16, -32768, 32768, -32768, 32767},
+                {i16, 0, 65536, -32768, 32767},  // more than a full turn
+                {i8, 100, 200, -128, 127},
+                {u8, -1, 0, 0, 255},
+                {i32, 0, 2147483648.0, -2147483648.0, 2147483647.0},
+                {i32, -kInfinity, 5, -2147483648.0, 2147483647.0},  // an open end
+                {i32, 1e300, 1e300, -2147483648.0, 2147483647.0},   // beyond the 64-bit view
+                {i16, 5, 3, -32768, 32767},                         // no range at all
+                {i16, kNaN, 3, -32768, 32767}});
+}
+
+TEST(CastRange, AnIntegerRangeBetweenTwoWrapsKeepsItsWidth) {
+  const KV_DataType *i16 = KV_DataType::int16(), *i8 = KV_DataType::int8();
+  const KV_DataType *u32 = KV_DataType::uint32(), *u8 = KV_DataType::uint8();
+  expectRanges({{i16, -1, 1, -1, 1},
+                {i16, 32768, 32770, -32768, -32766},
+                {i8, 200, 300, -56, 44},
+                {u8, -2.5, -1.5, 254, 255},  // truncated toward zero first
+                {u8, 0.5, 255.9, 0, 255},
+                {u32, 4294967296.0, 4294967301.0, 0, 5}});
+}
+
+TEST(CastRange, BooleansFloatsAndTypesWithoutConversion) {
+  const KV_DataType* boolean = KV_DataType::boolean();
+  expectRanges(
+      {{boolean, -50, 50, 0, 1}, {boolean, 1, 101, 1, 1}, {boolean, 0, 0, 0, 0}, {boolean, -3, -1, 1, 1}},
+      true);
+  expectRanges({{boolean, 250, 260, 0, 255}, {boolean, 3, 5, 3, 5}});  // not normalised: the low byte
+  expectRanges({{KV_DataType::float32(), 0.1, 1e39, static_cast<double>(0.1f), kInfinity},
+                {KV_DataType::float64(), -kInfinity, 3, -kInfinity, 3},
+                {KV_DataType::float64(), 5, 3, -kInfinity, kInfinity}});
+  double minimum = 200, maximum = 300;
+  castRange(nullptr, minimum, maximum, true);
+  EXPECT_EQ(minimum, 200);  // no type, nothing to convert
+  EXPECT_EQ(maximum, 300);
+}
+
 }  // namespace

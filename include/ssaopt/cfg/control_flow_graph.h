@@ -440,7 +440,7 @@ private:
                        ssaopt::list<ssaopt::edge>& cfgWorkList, ssaopt::list<ssaopt::edge>& ssaWorkList,
                        bool& changed, bool stores);
   template <class Definition>
-  void recordRange(KvCCfgVariable* pVariable, const Definition& definition);
+  void recordRange(KvCCfgVariable* pVariable, const Definition& definition, bool stores);
   void visitPhiFunction(KvCPhiFunction* pPhi, ssaopt::node v, bool& changed);
 
   int countExecutableInEdges(ssaopt::node v) const;
@@ -485,6 +485,9 @@ private:
   // a phi operand was removed.
   bool eliminateDeadCode();
   bool isDeadBlock(ssaopt::node v) const;
+  void keepExitsAttached();
+  bool losesEveryInEdge(ssaopt::node v) const;
+  ssaopt::map<KvCCfgProcedure*, ssaopt::edge> firstEdgesIntoDeadCode() const;
   // A reached phi node that a control-flow edge of `v` leads to, or nil.
   ssaopt::node reachedPhiSuccessor(ssaopt::node v) const;
   KvCPhiFunction* phiFunctionAt(ssaopt::node v) const;

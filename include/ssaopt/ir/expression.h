@@ -41,6 +41,8 @@ public:
   virtual bool isVariableEqualToConstant(KvCCfgVariable*& var, KvCCfgValue& value, bool& inequality) const;
   virtual bool hasSideEffects() const;
   virtual KvCCfgSFExpression* isSFExpression();
+  // The library's own expression over a set of variables (an interface statement's), or null.
+  virtual KvCCfgVariableExpression* isVariableExpression();
   // Notice that the expression compares a Boolean with a constant other than 0 and 1.
   virtual void actOnComparisonOutsideBoolRange() = 0;
 

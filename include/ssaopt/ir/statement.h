@@ -194,6 +194,15 @@ public:
   KvCCfgValue evaluate() const;
   KvCCfgValue getMinimum() const;
   KvCCfgValue getMaximum() const;
+  // The same over what the formal holds once the statement ran for each call, which constant
+  // propagation records: an argument stored as an assignment stores it (its value adjusted, its range
+  // fitted to the formal), except that a variable expression of the formal's own variable passes on a
+  // value the variable already holds and stores nothing. Adjusting the meet of such a value again is
+  // wrong where storing is not idempotent: a uint16 saturated at 20 holds 65534 after storing -2,
+  // which a second store saturates to 20.
+  KvCCfgValue evaluateHeld() const;
+  KvCCfgValue getHeldMinimum() const;
+  KvCCfgValue getHeldMaximum() const;
 
 private:
   KvCCfgVariable* m_pVariable;

@@ -44,12 +44,20 @@ public:
   virtual bool isOutput() const;
   virtual KvCCfgSFVariable* isSFVariable();
   virtual KvCSSAVariable* isSSAVariable();
+  // Makes [minimum, maximum], bounds of values the variable already holds (a phi function's or a
+  // value return's, merged from versions of the same variable), its range without fitting them
+  // again. The base passes each bound to setMinValueAndDestroyOld and setMaxValueAndDestroyOld.
+  virtual void setVarRange(const KvCCfgValue& minimum, const KvCCfgValue& maximum);
 
   std::uint32_t getIndex() const { return m_Index; }
   static void boot();
 
   // The current value, still owned by the variable.
   KvCCfgValue* getValue() const { return m_pValue; }
+  // Adjusts `value` in place to what the variable holds once it is stored, storing nothing: the
+  // saturated border, else the scaling's represented value, else the value cast to the data type
+  // (a Boolean becomes 0 or 1); non-constant for an array or volatile variable.
+  void adjustCfgValue(KvCCfgValue& value) const;
   // Adjusts `value` in place to what the variable can hold and stores a copy as the current value.
   // The value object replaced is not deleted: a caller that fetched it with getValue() owns it now.
   void setVarValueAndAdjustCfgValue(KvCCfgValue& value);
@@ -59,6 +67,22 @@ public:
   // would clamp to 20). Array and volatile variables still become non-constant. The replaced value
   // object is the caller's, as with setVarValueAndAdjustCfgValue.
   void setVarValue(KvCCfgValue& value);
+  // Brings [minimum, maximum], bounds of the values assigned to the variable, in place to the least
+  // range of what the variable then holds: what saturation makes of the values beyond a saturated
+  // border (the limit), and what the scaling or the data type makes of those within the borders
+  // (castRange: an integer type wrapped inside the range gives the type's whole range). Fitting the
+  // two bounds alone would claim too little wherever the type wraps between them. A bound that is
+  // not a constant counts as open; an undetermined one stays undetermined, a non-constant one stays
+  // non-constant unless the type bounds that side, and an infinite end that was not a constant
+  // becomes non-constant again. Values that may be NaN have no number as a bound on either side
+  // (both bounds open, or the constant NaN): a float or scaled variable keeps a stored NaN, which
+  // saturation leaves alone and no range holds, so such a variable gets no bound then, while a range
+  // bounded by a number on at least one side holds numbers only. With both bounds open it gives the
+  // range every value of the variable (an element of an array) keeps.
+  void fitRange(KvCCfgValue& minimum, KvCCfgValue& maximum) const;
+  // Fits [minimum, maximum], bounds of the values assigned, in place (fitRange) and makes it the
+  // variable's range (setVarRange).
+  void setVarRangeAndAdjust(KvCCfgValue& minimum, KvCCfgValue& maximum);
   // Clamps the number of `value` (whatever its kind) to the saturated borders; true when it changed.
   bool ConsiderSaturation(KvCCfgValue& value) const;
   bool isScaled() const;
@@ -101,6 +125,12 @@ protected:
 
 private:
   void dropValueToNonConstant();
+  // Whether storing NaN leaves NaN.
+  bool storesNaN() const;
+  // What saturation makes of a number beyond a saturated border.
+  double saturated(double number) const;
+  // Brings a range within the saturated borders to what storing its numbers gives.
+  void convertRange(double& from, double& to) const;
 
   static std::uint32_t s_GlobIndexCnt;
 
@@ -122,7 +152,9 @@ public:
   explicit KvCSSAVariable(KvCCfgVariable* var);
 
   ~KvCSSAVariable() override;
-  // Replace the bound by a copy of `value` adjusted to the variable; `value` itself stays unchanged.
+  // Replace the bound by a copy of `value` adjusted to the variable as a single value would be;
+  // `value` itself stays unchanged. A bound fitted alone holds only while the type does not wrap
+  // between the two bounds: constant propagation fits both together (setVarRangeAndAdjust).
   void setMinValueAndDestroyOld(KvCCfgValue& value) override;
   void setMaxValueAndDestroyOld(KvCCfgValue& value) override;
   KvCCfgValue* getMinValue() const override { return m_pMinValue; }
@@ -136,12 +168,15 @@ public:
   double getLowerLimit() const override;
   const KvCCfgValue* getInitValue() const override;
   KvCSSAVariable* isSSAVariable() override { return this; }
+  // Replaces both bounds by copies of the given ones; an array or volatile variable gets none.
+  void setVarRange(const KvCCfgValue& minimum, const KvCCfgValue& maximum) override;
 
   void setOrigVar(KvCCfgVariable* var);
   KvCCfgVariable* getOrigVar() const { return m_pOrigVar; }
 
 private:
   void replaceBound(KvCCfgValue*& pBound, const KvCCfgValue& value);
+  void storeBound(KvCCfgValue*& pBound, const KvCCfgValue& value);
 
   KvCCfgVariable* m_pOrigVar = nullptr;
   KvCCfgValue* m_pMinValue;

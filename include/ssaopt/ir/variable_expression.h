@@ -31,6 +31,7 @@ public:
   void replaceConstantCondition() override {}
   void foldConstants() override {}
   void actOnComparisonOutsideBoolRange() override {}
+  KvCCfgVariableExpression* isVariableExpression() override { return this; }
 
 private:
   ssaopt::list<KvCCfgValue*> memberValues() const;

@@ -106,3 +106,11 @@ KvCCfgValue determineMaximum(const ssaopt::list<KvCCfgValue*>& values);
 // callers apply it to constants.
 KvCCfgValue& cast(const KV_DataType* type, KvCCfgValue& v, bool normaliseBool);
 KvCCfgValue& cast(const KV_DataType* type, KvCCfgValue& v);
+
+// Brings [minimum, maximum] to the least range holding what cast makes of every number in it; an
+// infinite end stands for an open one, and an inverted or NaN range for no range at all. Casting the
+// two ends alone is wrong wherever the type wraps between them: an int16 in [-32768, 32768] holds
+// every int16, not only -32768. So an integer type (and a Boolean not normalised) gives its whole
+// range unless both ends lie between the same two wraps; a normalised Boolean gives 0 or 1 or both;
+// float32 rounds both ends; a null type, a type without a base type and float64 leave them.
+void castRange(const KV_DataType* type, double& minimum, double& maximum, bool normaliseBool);

@@ -160,6 +160,18 @@ struct RunLimits {
   std::size_t maxCallDepth = kDefaultMaxCallDepth;
 };
 
+// Told what a run does that constant propagation made claims about (see checkPropagation).
+class RunObserver {
+public:
+  virtual ~RunObserver() = default;
+  // An SSA version of a scalar variable that is neither volatile nor an array was defined where the
+  // run is, and its variable now holds `value`. Phi functions, value returns and virtual assignments
+  // count, though they compute nothing: the version is the value the variable holds there.
+  virtual void defined(KvCCfgVariable& version, double value, std::uint64_t step) = 0;
+  // The condition of block `block` sent control to its true or its false edge.
+  virtual void branched(ssaopt::node block, bool taken, std::uint64_t step) = 0;
+};
+
 namespace detail {
 struct ProgramCode;
 }
@@ -175,8 +187,9 @@ public:
   Interpreter(const Interpreter&) = delete;
   Interpreter& operator=(const Interpreter&) = delete;
 
-  // Runs from the start with every variable at its initial value.
-  Trace run(const RunLimits& limits, InputStreams& inputs) const;
+  // Runs from the start with every variable at its initial value, telling `pObserver`, when given,
+  // of every definition and branch.
+  Trace run(const RunLimits& limits, InputStreams& inputs, RunObserver* pObserver = nullptr) const;
 
 private:
   std::unique_ptr<const detail::ProgramCode> m_pCode;
@@ -213,5 +226,31 @@ CheckReport checkBehaviour(const Program& original, const Program& transformed,
 
 // One line per inconclusive run, then the difference, or "same behaviour on N runs".
 std::string formatReport(const CheckReport& report);
+
+// ---- The oracle of constant propagation ---------------------------------------------------------
+
+// The first claim of constant propagation that a run contradicts: where, and what.
+struct PropagationViolation {
+  std::uint64_t seed;
+  std::uint64_t step;
+  std::string fact;  // "x.5 = 32767, outside its propagated range [-32768, -32768]"
+};
+
+struct PropagationReport {
+  std::uint64_t runs = 0;  // runs that contradicted nothing
+  std::optional<PropagationViolation> violation;
+};
+
+// Runs `program` as constant propagation left it (before later steps change it) on the streams of
+// `settings`, and checks what propagation claims against every run, until the first contradiction:
+// wherever a version is defined, the value its variable holds equals the version's constant and lies
+// in its range (a bound that is not a constant claims nothing); every branch goes the way its
+// condition's constant says; and no run faults, which after propagation means that control took an
+// edge that dead-code removal took away as never executed. A run stopped at a guard still counts up
+// to there.
+PropagationReport checkPropagation(const Program& program, const CheckSettings& settings);
+
+// The contradiction, or "propagated values held on N runs".
+std::string formatPropagationReport(const PropagationReport& report);
 
 }  // namespace ssaopt::client

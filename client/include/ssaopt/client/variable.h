@@ -62,11 +62,11 @@ namespace ssaopt::client {
 // The variable that `pVariable` stands for: the original of an SSA version, else itself.
 KvCCfgVariable* originalOf(KvCCfgVariable* pVariable);
 
-// The bounds every value of the variable keeps, whatever is assigned to it, from its saturation limits
-// and, for an unscaled integer or Boolean variable, the range of its data type. A store that does not
-// saturate converts the value, which may take it a little past a limit (to the scaling's grid, to
-// float32) or, for an integer type, wrap it anywhere within the type unless limits inside the type
-// close both sides. Empty where there is none.
+// The bounds every value read from the variable keeps, whatever is assigned to it (fitRange of an
+// open range): for an unscaled integer or Boolean variable the range of its data type, narrowed by
+// saturation limits only where the values within them cannot wrap past them; for a scaled or float
+// variable the saturation limits, or what the scaling rounds them to, where it is volatile (its reads
+// are inputs, numbers) and none otherwise (a stored NaN stays NaN). Empty where there is none.
 std::optional<double> declaredLowerBound(const KvCCfgVariable& variable);
 std::optional<double> declaredUpperBound(const KvCCfgVariable& variable);
 
