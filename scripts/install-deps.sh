@@ -3,9 +3,10 @@
 set -euo pipefail
 
 # graphviz: the pictures (--emit=dot, the HTML report); chromium: the test that loads the HTML report;
-# valgrind: the install check runs a consumer project under it; doxygen: the API reference.
+# clang: the front end's libFuzzer target and the second compiler of the emitted C; valgrind: the install
+# check runs a consumer project under it; doxygen: the API reference; python3: the code-size measurement.
 packages=(g++ cmake ninja-build libgtest-dev libgmock-dev libbenchmark-dev graphviz chromium clang
-  libclang-rt-14-dev valgrind doxygen)
+  libclang-rt-14-dev valgrind doxygen python3)
 
 missing=()
 for package in "${packages[@]}"; do

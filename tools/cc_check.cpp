@@ -2,14 +2,17 @@
 
 #include <unistd.h>
 
+#include <cctype>
 #include <chrono>
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <map>
 #include <memory>
+#include <optional>
 #include <sstream>
 
 #include "exit_status.h"
@@ -165,6 +168,36 @@ std::string harnessText(const client::EmittedC& emitted) {
   return text + "\n" + hooks;
 }
 
+// The words of a command line as a shell splits it: blanks separate words, single quotes keep
+// everything, double quotes keep everything but a backslash before \\, ", $ or `, and a backslash
+// outside quotes keeps the next character.
+std::vector<std::string> shellWords(const std::string& line) {
+  std::vector<std::string> words;
+  std::optional<std::string> word;  // the word being read
+  char quote = 0;
+  for (std::size_t i = 0; i < line.size(); ++i) {
+    char c = line[i];
+    if (!quote && std::isspace(static_cast<unsigned char>(c))) {
+      if (word) words.push_back(*word);
+      word.reset();
+      continue;
+    }
+    if (!word) word.emplace();
+    bool escapes = c == '\\' && i + 1 < line.size() &&
+                   (quote == 0 || (quote == '"' && std::strchr("\\\"$`", line[i + 1])));
+    if (escapes)
+      *word += line[++i];
+    else if (c == quote)
+      quote = 0;
+    else if (!quote && (c == '\'' || c == '"'))
+      quote = c;
+    else
+      *word += c;
+  }
+  if (word) words.push_back(*word);
+  return words;
+}
+
 // ---- Traces -----------------------------------------------------------------------------------------
 
 // The interpreter's trace as the compiled program prints it: without the statement count.
@@ -270,7 +303,8 @@ private:
       return kFailure;
     }
     if (!build(*pOriginal, "original", {}) || !build(*pOptimised, "optimised", {}) ||
-        !build(*pOptimised, "optimised", {"-fsanitize=undefined", "-fno-sanitize-recover=undefined"}))
+        !build(*pOptimised, "optimised",
+               {"-fsanitize=undefined", "-fno-sanitize-recover=undefined", "-DSSA_CHECK_RANGES"}))
       return kFailure;
     return compareRuns(*pOriginal, *pOptimised);
   }
@@ -279,21 +313,23 @@ private:
     return loadProgramAndRunPipeline(m_Options.inputPath, pipeline, showWarnings, m_Err);
   }
 
+  // $CC, which may carry flags ("clang -m32"), else cc.
   static std::string compiler() {
     const char* pCompiler = std::getenv("CC");
-    return pCompiler && *pCompiler ? pCompiler : "cc";
+    return pCompiler && !shellWords(pCompiler).empty() ? pCompiler : "cc";
   }
 
   // Emits and compiles the program; false after saying why it failed.
   bool build(const client::Program& program, const std::string& name, const std::vector<std::string>& flags) {
     std::string stem = name + (flags.empty() ? "" : "_sanitized");
-    client::EmittedC emitted = client::emitC(program);
+    client::EmittedC emitted = client::emitC(program, client::EmitOptions{!m_Options.keepChecks});
     fs::path source = m_Directory.path() / (stem + ".c"), harness = m_Directory.path() / (stem + "_main.c");
     std::ofstream(source) << emitted.text;
     std::ofstream(harness) << harnessText(emitted);
-    Binary binary{"compiled " + name + (flags.empty() ? "" : " (-fsanitize=undefined)"),
+    Binary binary{"compiled " + name + (flags.empty() ? "" : " (-fsanitize=undefined -DSSA_CHECK_RANGES)"),
                   m_Directory.path() / stem};
-    std::vector<std::string> command{compiler(), "-std=c99", "-O2", "-Wall", "-Werror"};
+    std::vector<std::string> command = shellWords(compiler());
+    command.insert(command.end(), {"-std=c99", "-O2", "-Wall", "-Wextra", "-Werror"});
     command.insert(command.end(), flags.begin(), flags.end());
     command.insert(command.end(), {source.string(), harness.string(), "-o", binary.path.string()});
     Outcome outcome = runProcess(command, "", m_Directory.path(), kCompileTimeout);

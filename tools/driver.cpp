@@ -118,7 +118,7 @@ private:
       case Emit::Dot:
         return client::writeDot(*m_pProgram, client::DotOptions{m_Options.showValues, procedure});
       case Emit::C:
-        return client::emitC(*m_pProgram).text;
+        return client::emitC(*m_pProgram, client::EmitOptions{!m_Options.keepChecks}).text;
       case Emit::Html:
         return m_Report->page(statistics, times);
       case Emit::Text:

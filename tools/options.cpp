@@ -164,6 +164,12 @@ const OptionSpec kOptions[] = {
        options.filterProcedure = value;
        return value.empty() ? std::string("--filter-procedure needs a procedure name") : std::string();
      }},
+    {"--keep-checks", nullptr, kMain | kCcCheck,
+     "in C output, keep each saturation, cast and index check that the propagated ranges show to be needless",
+     [](Options& options, const std::string&) {
+       options.keepChecks = true;
+       return std::string();
+     }},
     {"--verify", nullptr, kMain,
      "check the graph after every pass with internal checks on; report every internal error and consistency failure and exit with 1",
      [](Options& options, const std::string&) {

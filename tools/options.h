@@ -34,6 +34,7 @@ struct Options {
   Emit emit = Emit::Text;
   std::string outputPath;  // empty or "-": standard output
   bool showValues = false;
+  bool keepChecks = false;  // in C: also the checks that propagated ranges make needless
   bool verify = false;
   bool stats = false;
   bool timePasses = false;

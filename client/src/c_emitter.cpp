@@ -6,6 +6,7 @@
 #include <set>
 #include <sstream>
 #include <unordered_map>
+#include <unordered_set>
 
 #include "c_emitter_code.h"
 #include "program_view.h"
@@ -38,29 +39,29 @@ std::string cString(const std::string& text) {
 
 class CEmitter {
 public:
-  explicit CEmitter(const Program& program)
+  CEmitter(const Program& program, const EmitOptions& options)
       : m_Program(program),
         m_Graph(program.graph()),
         m_View(program),
         m_Variables(program),
-        m_Statements(m_Variables),
-        m_ArgumentsAtCalls(!detail::isInSSAForm(m_Graph)) {}
+        m_ArgumentsAtCalls(!detail::isInSSAForm(m_Graph)),
+        // Ranges are those that propagation leaves in the SSA versions; a program as written has none.
+        m_Statements(m_Variables, options.useRanges && !m_ArgumentsAtCalls) {}
 
   EmittedC emit() {
     findPlacedParameters();
-    std::ostringstream procedures, prototypes;
-    // The front end makes sure that there is a "#main", and no step of the pipeline removes it.
-    for (const ProcedureView& procedure : m_View.procedures()) {
-      bool isMain = procedure.name == kMainName;
-      if (!isMain) prototypes << "void " << CStatements::procedureName(procedure.name) << "(void);\n";
-      procedures << "\n" << functionText(procedure, isMain);
-    }
-    std::string outputs = outputsText();
+    findBlocksByProcedure();
+    findRedundantInitialStores();
+    std::string code = proceduresText() + "\n" + stepFunctionsText() + outputsText();
+    std::vector<detail::CHelper> variableHelpers = m_Variables.helpers();
+    std::vector<const detail::CHelper*> helpers;
+    for (const detail::CHelper& helper : detail::cRuntimeHelpers()) helpers.push_back(&helper);
+    for (const detail::CHelper& helper : variableHelpers) helpers.push_back(&helper);
+    std::string called = detail::calledHelpersText(helpers, code);
     EmittedC emitted;
     emitted.text = "/* Emitted by ssaopt: one pass of \"#main\" per call of ssaopt_step(). */\n" +
-                   std::string(detail::cRuntimeText()) + "\n" + m_Variables.declarations() +
-                   prototypes.str() + "static int ssa_main(int ssa_resume);\n" + procedures.str() + "\n" +
-                   stepFunctionsText() + outputs;
+                   std::string(detail::cPreludeText()) + "\n" + m_Variables.declarations() + called +
+                   (called.empty() ? "" : "\n") + code;
     for (const CVariable& variable : m_Variables.all())
       if (detail::CVariables::hasInputHook(variable))
         emitted.inputs.push_back(
@@ -77,7 +78,81 @@ private:
             m_Statements.placeParameter(pParam);
   }
 
+  // Until a variable is first written it holds its initial value, which its static initialiser gave
+  // it. The first step runs the blocks from the start of "#main" that nothing else jumps to; there a
+  // constant assignment that stores the initial value into a variable not yet written changes
+  // nothing, and leaving it out lets the compiler see that a variable never written is a constant.
+  void findRedundantInitialStores() {
+    const ProcedureView* pMain = mainProcedure();
+    std::set<const KvCCfgSFVariable*> written;
+    for (node v = pMain ? firstBlock(*pMain) : ssaopt::nil; v != ssaopt::nil; v = onlyContinuation(v)) {
+      for (KvCCfgStatement* pStatement : m_Graph.getBasicBlock(v)->getStatementSeq()) {
+        if (pStatement->isProcedureCall() || pStatement->isExternCall()) return;
+        KvCCfgAssignment* pAssignment = pStatement->isAssignment();
+        if (!pAssignment || pAssignment->getIsVirtual() || !pAssignment->getLHS()) continue;
+        CVariable* pVariable = m_Variables.find(pAssignment->getLHS());
+        if (!pVariable) return;
+        if (written.insert(pVariable->pVariable).second &&
+            m_Statements.storesInitialValue(*pAssignment, *pVariable))
+          m_RedundantStores.insert(pStatement);
+      }
+    }
+  }
+
+  const ProcedureView* mainProcedure() const {
+    for (const ProcedureView& procedure : m_View.procedures())
+      if (procedure.name == kMainName) return &procedure;
+    return nullptr;
+  }
+
+  node firstBlock(const ProcedureView& procedure) const {
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(procedure.pProcedure->getEntryNode());
+    return out.size() == 1 ? onlyReachedFrom(m_Graph.target(out.front())) : ssaopt::nil;
+  }
+
+  // The block that `v` always goes on to, where nothing else leads to it.
+  node onlyContinuation(node v) const {
+    ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(v);
+    if (m_Graph.getBasicBlock(v)->getBranchCond() || out.size() != 1) return ssaopt::nil;
+    return onlyReachedFrom(m_Graph.target(out.front()));
+  }
+
+  node onlyReachedFrom(node v) const {
+    return m_Graph.getBasicBlock(v) && m_View.hasOneControlInEdge(v) ? v : ssaopt::nil;
+  }
+
   // ---- Functions ---------------------------------------------------------------------------------
+
+  // The functions of "#main" and of the procedures it calls, directly or through others, in the
+  // printer's order: a unit holds no function that nothing calls.
+  std::string proceduresText() {
+    const std::vector<ProcedureView>& procedures = m_View.procedures();
+    std::unordered_map<std::string, std::size_t> byName;
+    std::vector<std::size_t> pending;
+    for (std::size_t i = 0; i < procedures.size(); ++i) {
+      if (procedures[i].name == kMainName) pending.push_back(i);
+      byName.emplace(CStatements::procedureName(procedures[i].name), i);
+    }
+    std::vector<std::string> functions(procedures.size());
+    std::vector<bool> emitted(procedures.size(), false);
+    while (!pending.empty()) {
+      std::size_t i = pending.back();
+      pending.pop_back();
+      if (emitted[i]) continue;
+      emitted[i] = true;
+      functions[i] = functionText(procedures[i], procedures[i].name == kMainName);
+      for (const std::string& name : detail::functionNamesIn(functions[i]))
+        if (auto called = byName.find(name); called != byName.end()) pending.push_back(called->second);
+    }
+    std::string prototypes, definitions;
+    for (std::size_t i = 0; i < procedures.size(); ++i) {
+      if (!emitted[i]) continue;
+      if (procedures[i].name != kMainName)
+        prototypes += "static void " + CStatements::procedureName(procedures[i].name) + "(void);\n";
+      definitions += "\n" + functions[i];
+    }
+    return prototypes + "static int ssa_main(int ssa_resume);\n" + definitions;
+  }
 
   struct Function {
     bool isMain;
@@ -102,7 +177,7 @@ private:
               "static int ssa_main(int ssa_resume) {\n"
            << resumeLines(function);
     else
-      text << "void " << CStatements::procedureName(procedure.name) << "(void) {\n";
+      text << "static void " << CStatements::procedureName(procedure.name) << "(void) {\n";
     for (std::size_t i = 0; i < function.blocks.size(); ++i) {
       if (function.jumpedTo.count(function.blocks[i].index()))
         text << function.labels[function.blocks[i].index()] << ":\n";
@@ -123,9 +198,15 @@ private:
     ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(entry);
     if (out.size() == 1) place(m_Graph.target(out.front()));
     for (node v : procedure.blocks) place(v);
-    for (node v : m_Graph.nodes())
-      if (m_Graph.getBasicBlock(v) && m_Graph.inf(v)->getProcedure() == procedure.pProcedure) place(v);
+    if (auto all = m_BlocksByProcedure.find(procedure.pProcedure); all != m_BlocksByProcedure.end())
+      for (node v : all->second) place(v);
     return blocks;
+  }
+
+  // Every block of each procedure in node order, found in one pass over the graph.
+  void findBlocksByProcedure() {
+    for (node v : m_Graph.nodes())
+      if (m_Graph.getBasicBlock(v)) m_BlocksByProcedure[m_Graph.inf(v)->getProcedure()].push_back(v);
   }
 
   void assignLabels(Function& function) const {
@@ -154,6 +235,7 @@ private:
     KvCBasicBlock& block = *m_Graph.getBasicBlock(v);
     std::vector<std::string> lines;
     for (KvCCfgStatement* pStatement : block.getStatementSeq()) {
+      if (m_RedundantStores.count(pStatement)) continue;
       try {
         std::vector<std::string> code = m_Statements.statement(*pStatement, m_Graph, m_ArgumentsAtCalls);
         lines.insert(lines.end(), code.begin(), code.end());
@@ -262,12 +344,16 @@ private:
   const KvCControlFlowGraph& m_Graph;
   detail::ProgramView m_View;
   detail::CVariables m_Variables;
-  CStatements m_Statements;
   bool m_ArgumentsAtCalls;
+  CStatements m_Statements;
+  std::unordered_set<const KvCCfgStatement*> m_RedundantStores;
+  std::unordered_map<const KvCCfgProcedure*, std::vector<node>> m_BlocksByProcedure;
 };
 
 }  // namespace
 
-EmittedC emitC(const Program& program) { return CEmitter(program).emit(); }
+EmittedC emitC(const Program& program, const EmitOptions& options) {
+  return CEmitter(program, options).emit();
+}
 
 }  // namespace ssaopt::client

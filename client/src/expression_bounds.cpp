@@ -52,11 +52,16 @@ KvCCfgValue declaredOnly(std::optional<double> declared) {
   return declared ? KvCCfgValue(*declared) : kUnbounded;
 }
 
-Interval variableInterval(const KvCCfgVariable& variable) {
+// Once propagation has ended, what it left undetermined is not known: such a bound is the declared one.
+KvCCfgValue settledBound(const KvCCfgValue& bound, bool settled) {
+  return settled && bound.isUndetermined() ? kUnbounded : bound;
+}
+
+Interval variableInterval(const KvCCfgVariable& variable, bool settled) {
   KvCCfgValue value = variable.getValue() ? *variable.getValue() : kUnbounded;
   if (value.isConstant()) return point(value);
-  KvCCfgValue lo = variable.getMinValue() ? *variable.getMinValue() : value;
-  KvCCfgValue hi = variable.getMaxValue() ? *variable.getMaxValue() : value;
+  KvCCfgValue lo = settledBound(variable.getMinValue() ? *variable.getMinValue() : value, settled);
+  KvCCfgValue hi = settledBound(variable.getMaxValue() ? *variable.getMaxValue() : value, settled);
   return {orDeclared(lo, ssaopt::client::declaredLowerBound(variable)),
           orDeclared(hi, ssaopt::client::declaredUpperBound(variable))};
 }
@@ -180,6 +185,14 @@ KvCCfgValue KvCCfgSFExpression::bound(bool lower) const {
   if (isMarkedAsEvalToNonConst()) return kUnbounded;
   KvCCfgValue value = evaluate();
   if (value.isConstant()) return value;
+  std::vector<Bounds> terms = getTermBounds(false);
+  if (terms.empty()) return kUnbounded;
+  return lower ? terms.back().first : terms.back().second;
+}
+
+std::vector<KvCCfgSFExpression::Bounds> KvCCfgSFExpression::getTermBounds(bool settled) const {
+  std::vector<Bounds> bounds;
+  bounds.reserve(m_Terms.size());
   std::vector<Interval> stack;
   stack.reserve(m_Terms.size());
   for (const Term& term : m_Terms) {
@@ -188,7 +201,7 @@ KvCCfgValue KvCCfgSFExpression::bound(bool lower) const {
     if (term.op == TermOp::Literal)
       result = point(KvCCfgValue(term.number));
     else if (term.op == TermOp::Variable)
-      result = variableInterval(*term.pVariable);
+      result = variableInterval(*term.pVariable, settled);
     else if (term.op == TermOp::ElementRead)
       result = elementInterval(*term.pVariable);
     else if (term.op == TermOp::ElementWrite)
@@ -198,7 +211,7 @@ KvCCfgValue KvCCfgSFExpression::bound(bool lower) const {
           operatorInterval(term.op, stack.data() + (stack.size() - static_cast<std::size_t>(arity)), arity);
     stack.resize(stack.size() - static_cast<std::size_t>(arity));
     stack.push_back(result);
+    bounds.emplace_back(result.lo, result.hi);
   }
-  if (stack.empty()) return kUnbounded;
-  return lower ? stack.back().lo : stack.back().hi;
+  return bounds;
 }

@@ -128,7 +128,7 @@ node ProgramView::continuationOf(node v) const {
   ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(v);
   if (out.size() != 1 || m_Graph.getBasicBlock(v)->getBranchCond()) return ssaopt::nil;
   node next = m_Graph.target(out[0]);
-  return isShownBlock(next) && m_Graph.getControlFlowInEdges(next).size() == 1 ? next : ssaopt::nil;
+  return isShownBlock(next) && hasOneControlInEdge(next) ? next : ssaopt::nil;
 }
 
 // ---- Labels -----------------------------------------------------------------------------------------
@@ -238,6 +238,15 @@ bool ProgramView::precedes(KvCCfgVariable* a, KvCCfgVariable* b) const {
                            found == m_VersionNumbers.end() ? 0u : found->second, pVariable->getIndex());
   };
   return key(a) < key(b);
+}
+
+// ---- Edges ------------------------------------------------------------------------------------------
+
+bool ProgramView::hasOneControlInEdge(node v) const {
+  std::size_t count = 0;
+  for (edge e : m_Graph.in(v))
+    if (!m_Graph.inf(e)->isSSAEdge() && ++count > 1) return false;
+  return count == 1;
 }
 
 bool isInSSAForm(const KvCControlFlowGraph& graph) {

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <vector>
 
+#include "infix_text.h"
 #include "ssaopt/client/numbers.h"
 #include "ssaopt/client/statements.h"
 
@@ -10,67 +11,53 @@ namespace ssaopt::client::detail {
 
 namespace {
 
-// The text of a complete sub-expression, with the precedence of its outermost operator.
-struct Piece {
-  std::string text;
-  int precedence;
-};
-
-std::string parenthesised(const Piece& piece, bool needed) {
-  return needed ? "(" + piece.text + ")" : piece.text;
-}
-
-Piece literalPiece(double number) {
+InfixText::Term literalTerm(double number) {
   std::string text = formatNumber(number);
-  return Piece{text, text[0] == '-' ? kUnaryPrecedence : kAtomPrecedence};
+  return InfixText::Term{text, "", "", text[0] == '-' ? kUnaryPrecedence : kAtomPrecedence};
 }
 
-Piece operatorPiece(TermOp op, const Piece* operands) {
+InfixText::Term operatorTerm(TermOp op, const InfixText::Operand* operands) {
   std::string spelling = spellingOf(op);
   if (op == TermOp::Abs || op == TermOp::Sgn)
-    return Piece{spelling + "(" + operands[0].text + ")", kAtomPrecedence};
+    return InfixText::Term{spelling + "(", "", ")", kAtomPrecedence};
   if (arityOf(op) == 1) {
     // "-(-x)" rather than "--x", which reads as C's decrement.
     bool needed =
-        operands[0].precedence < kUnaryPrecedence || (op == TermOp::Negate && operands[0].text[0] == '-');
-    return Piece{spelling + parenthesised(operands[0], needed), kUnaryPrecedence};
+        operands[0].precedence < kUnaryPrecedence || (op == TermOp::Negate && operands[0].first == '-');
+    return InfixText::Term{spelling, "", "", kUnaryPrecedence, {needed, false}};
   }
   int precedence = precedenceOf(op);
-  return Piece{parenthesised(operands[0], operands[0].precedence < precedence) + " " + spelling + " " +
-                   parenthesised(operands[1], operands[1].precedence <= precedence),
-               precedence};
+  return InfixText::Term{"",
+                         " " + spelling + " ",
+                         "",
+                         precedence,
+                         {operands[0].precedence < precedence, operands[1].precedence <= precedence}};
 }
 
 // The pieces left after the first `count` terms: one for a complete expression, two (index and value)
 // for an element write without its last term.
-std::vector<Piece> formatTerms(const ProgramView& view, const KvCCfgSFExpression::Terms& terms,
-                               std::size_t count) {
-  std::vector<Piece> stack;
+InfixText formatTerms(const ProgramView& view, const KvCCfgSFExpression::Terms& terms, std::size_t count) {
+  InfixText text;
   for (std::size_t i = 0; i < count; ++i) {
     const KvCCfgSFExpression::Term& term = terms[i];
     std::size_t arity = static_cast<std::size_t>(arityOf(term.op));
-    Piece* operands = stack.data() + (stack.size() - arity);
-    Piece result;
     if (term.op == TermOp::Literal)
-      result = literalPiece(term.number);
+      text.push(0, literalTerm(term.number));
     else if (term.op == TermOp::Variable)
-      result = Piece{view.nameOf(term.pVariable), kAtomPrecedence};
+      text.push(0, InfixText::Term{view.nameOf(term.pVariable), "", "", kAtomPrecedence});
     else if (term.op == TermOp::ElementRead)
-      result = Piece{view.nameOf(term.pVariable) + "[" + operands[0].text + "]", kAtomPrecedence};
+      text.push(1, InfixText::Term{view.nameOf(term.pVariable) + "[", "", "]", kAtomPrecedence});
     else if (term.op == TermOp::ElementWrite)
-      result =
-          Piece{view.nameOf(term.pVariable) + " with [" + operands[0].text + "] = " + operands[1].text, 0};
+      text.push(2, InfixText::Term{view.nameOf(term.pVariable) + " with [", "] = ", "", 0});
     else
-      result = operatorPiece(term.op, operands);
-    stack.resize(stack.size() - arity);
-    stack.push_back(std::move(result));
+      text.push(arity, operatorTerm(term.op, text.operands(arity)));
   }
-  return stack;
+  return text;
 }
 
 std::string sfExpressionText(const ProgramView& view, const KvCCfgSFExpression& expression) {
-  std::vector<Piece> pieces = formatTerms(view, expression.getTerms(), expression.getTerms().size());
-  return pieces.empty() ? "?" : pieces.back().text;
+  InfixText text = formatTerms(view, expression.getTerms(), expression.getTerms().size());
+  return text.pieces() == 0 ? "?" : text.text(text.pieces() - 1);
 }
 
 std::string variableListText(const ProgramView& view, std::vector<KvCCfgVariable*> variables) {
@@ -85,9 +72,9 @@ std::string variableListText(const ProgramView& view, std::vector<KvCCfgVariable
 // elements it keeps.
 std::string elementWriteText(const ProgramView& view, KvCCfgVariable* pLHS, const KvCCfgSFExpression& rhs) {
   const KvCCfgSFExpression::Terms& terms = rhs.getTerms();
-  std::vector<Piece> pieces = formatTerms(view, terms, terms.size() - 1);
+  InfixText pieces = formatTerms(view, terms, terms.size() - 1);
   KvCCfgVariable* pKept = terms.back().pVariable;
-  std::string written = "[" + pieces[0].text + "] = " + pieces[1].text;
+  std::string written = "[" + pieces.text(0) + "] = " + pieces.text(1);
   if (pKept == pLHS) return view.nameOf(pLHS) + written;
   return view.nameOf(pLHS) + " = " + view.nameOf(pKept) + " with " + written;
 }

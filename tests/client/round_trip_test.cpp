@@ -23,6 +23,18 @@ TEST_F(RoundTrip, EveryExampleReadsBackToTheSameText) {
   }
 }
 
+TEST_F(RoundTrip, LongAndDeeplyNestedExpressionsReadBackWhole) {
+  // Each term's text is written once: no copying of operands into their parents, which costs the
+  // square of the length, and no recursion as deep as the nesting.
+  std::string sum = "b";
+  for (int i = 1; i < 100000; ++i) sum += " + b";
+  std::string nested = "b - b";
+  for (int i = 1; i < 900; ++i) nested = "b - (" + nested + ")";
+  std::string printed = printTwice("var int32 a;\nvar int32 b;\n\nproc #main {\n  a = " + sum +
+                                   ";\n  a = " + nested + ";\n}\n");
+  EXPECT_NE(printed.find("  a = " + sum + ";\n  a = " + nested + ";\n"), std::string::npos);
+}
+
 TEST_F(RoundTrip, OutlinedBlocksBecomeProceduresCalledWhereTheyWereReached) {
   EXPECT_EQ(printTwice(clienttest::readExample("outline")),
             "var int16 level volatile;\n"

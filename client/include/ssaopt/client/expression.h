@@ -9,6 +9,7 @@
 #include <cstddef>
 #include <memory>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "ssaopt/client/diagnostics.h"
@@ -40,6 +41,12 @@ public:
   // where no bound is known.
   KvCCfgValue getMinimum() const override;
   KvCCfgValue getMaximum() const override;
+  // The minimum and maximum of the sub-expression that each term ends, by the same rules; a front end
+  // reads them to leave out checks that the values cannot fail. Once propagation has `settled`, a
+  // bound it left undetermined (code it never reached, a loop it left open) is not known, and the
+  // declared bounds hold.
+  using Bounds = std::pair<KvCCfgValue, KvCCfgValue>;
+  std::vector<Bounds> getTermBounds(bool settled) const;
   // Reads of variables whose current value is constant become that constant.
   void replaceConstantVariables() override;
   // A condition whose value is constant, and that has no side effect to keep, becomes that constant.
