@@ -118,7 +118,7 @@ private:
   }
 
   node onlyReachedFrom(node v) const {
-    return m_Graph.getBasicBlock(v) && m_View.hasOneControlInEdge(v) ? v : ssaopt::nil;
+    return m_Graph.getBasicBlock(v) && m_Graph.hasOneControlFlowInEdge(v) ? v : ssaopt::nil;
   }
 
   // ---- Functions ---------------------------------------------------------------------------------

@@ -118,7 +118,8 @@ bool ProgramView::isShownBlock(node v) const { return m_Graph.getBasicBlock(v) &
 void ProgramView::layOutProcedures() {
   for (const ssaopt::ProcedureBlocks& laidOut :
        m_Graph.getProgramOrder([this](node v) { return !m_Hidden[v]; }))
-    m_Procedures.push_back(ProcedureView{laidOut.pProcedure, laidOut.pProcedure->getName().cstring(),
+    m_Procedures.push_back(ProcedureView{laidOut.pProcedure,
+                                         laidOut.pProcedure->getName().cstring(),
                                          {laidOut.blocks.begin(), laidOut.blocks.end()}});
 }
 
@@ -128,7 +129,7 @@ node ProgramView::continuationOf(node v) const {
   ssaopt::array<edge> out = m_Graph.getControlFlowOutEdges(v);
   if (out.size() != 1 || m_Graph.getBasicBlock(v)->getBranchCond()) return ssaopt::nil;
   node next = m_Graph.target(out[0]);
-  return isShownBlock(next) && hasOneControlInEdge(next) ? next : ssaopt::nil;
+  return isShownBlock(next) && m_Graph.hasOneControlFlowInEdge(next) ? next : ssaopt::nil;
 }
 
 // ---- Labels -----------------------------------------------------------------------------------------
@@ -240,14 +241,7 @@ bool ProgramView::precedes(KvCCfgVariable* a, KvCCfgVariable* b) const {
   return key(a) < key(b);
 }
 
-// ---- Edges ------------------------------------------------------------------------------------------
-
-bool ProgramView::hasOneControlInEdge(node v) const {
-  std::size_t count = 0;
-  for (edge e : m_Graph.in(v))
-    if (!m_Graph.inf(e)->isSSAEdge() && ++count > 1) return false;
-  return count == 1;
-}
+// ---- Shared with the printer and the C emitter -----------------------------------------------------
 
 bool isInSSAForm(const KvCControlFlowGraph& graph) {
   return graph.getState().has(ssaopt::GraphFact::SSAForm);

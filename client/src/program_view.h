@@ -52,9 +52,6 @@ public:
   // Declaration order, versions of one variable in their order.
   bool precedes(KvCCfgVariable* a, KvCCfgVariable* b) const;
 
-  // Whether `v` has one control-flow in-edge, found without listing them all: a block that many
-  // branches join is asked once for each of them.
-  bool hasOneControlInEdge(ssaopt::node v) const;
   // The block that `v` falls into and that nothing else enters, or nil: blocks printed one after the
   // other as one piece of straight-line code.
   ssaopt::node continuationOf(ssaopt::node v) const;

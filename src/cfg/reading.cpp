@@ -33,6 +33,13 @@ array<edge> KvCControlFlowGraph::getControlFlowInEdges(node v) const {
   return edges;
 }
 
+bool KvCControlFlowGraph::hasOneControlFlowInEdge(node v) const {
+  std::size_t count = 0;
+  for (edge e : in(v))
+    if (isControlFlowEdge(e) && ++count > 1) return false;
+  return count == 1;
+}
+
 // ---- Chains of phi functions ---------------------------------------------------------------------
 
 // Dividing puts a block's phi functions first, one per block, so a link into a block that holds a phi
@@ -95,7 +102,7 @@ private:
     array<edge> out = m_G.getControlFlowOutEdges(v);
     if (out.size() != 1) return nil;
     node next = m_G.target(out[0]);
-    return isShown(next) && m_G.getControlFlowInEdges(next).size() == 1 ? next : node(nil);
+    return isShown(next) && m_G.hasOneControlFlowInEdge(next) ? next : node(nil);
   }
 
   const KvCControlFlowGraph& m_G;

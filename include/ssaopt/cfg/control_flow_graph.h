@@ -101,6 +101,9 @@ public:
   // The control-flow out-edges and in-edges of `v`, in adjacency order.
   ssaopt::array<ssaopt::edge> getControlFlowOutEdges(ssaopt::node v) const;
   ssaopt::array<ssaopt::edge> getControlFlowInEdges(ssaopt::node v) const;
+  // Whether exactly one control-flow edge enters `v`; stops at the second, so a join of many
+  // branches costs little to ask.
+  bool hasOneControlFlowInEdge(ssaopt::node v) const;
   // The node whose control-flow in-edges the operands of the phi functions of `v` belong to: `v`
   // itself, or after divideBasicBlock the first node of the chain of one-phi blocks that `v` lies
   // on (its blocks may since have been emptied by removeUnusedVarDefs). Costs the length of the
