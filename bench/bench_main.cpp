@@ -33,7 +33,8 @@ int main(int argc, char** argv) {
   benchmark::AddCustomContext("ssaopt_build_type", SSAOPT_BUILD_TYPE);
   benchmark::AddCustomContext("processor", processorModel());
   std::string steps;
-  for (const ssaopt::PipelineStep* pStep : ssaopt::typicalRun()) steps += (steps.empty() ? "" : " ") + std::string(pStep->name);
+  for (const ssaopt::PipelineStep* pStep : ssaopt::typicalRun())
+    steps += (steps.empty() ? "" : " ") + std::string(pStep->name);
   benchmark::AddCustomContext("pipeline_steps", steps);
   ssaopt::bench::registerPipelineBenchmarks();
   ssaopt::bench::registerDominatorBenchmarks();

@@ -157,8 +157,8 @@ private:
            << std::setprecision(3) << std::setw(12) << time.second << " ms\n";
       total += time.second;
     }
-    text << "time " << std::left << std::setw(20) << "total" << std::right << std::fixed << std::setprecision(3)
-         << std::setw(12) << total << " ms\n";
+    text << "time " << std::left << std::setw(20) << "total" << std::right << std::fixed
+         << std::setprecision(3) << std::setw(12) << total << " ms\n";
     // What the library held at most, from reading the program to the end of the last pass.
     text << "peak memory " << std::left << std::setw(14) << "" << std::right << std::setw(12)
          << std::setprecision(1) << static_cast<double>(m_Pool.peakBytes()) / 1024 << " KiB\n";

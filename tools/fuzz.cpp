@@ -121,7 +121,8 @@ private:
     return m_Options.passes.value_or(defaultPipeline());
   }
 
-  void writeProgram(const std::string& path, const std::string& text, ProblemKind kind, const ProgramCheck& check) {
+  void writeProgram(const std::string& path, const std::string& text, ProblemKind kind,
+                    const ProgramCheck& check) {
     std::ofstream(path, std::ios::binary) << text;
     m_Err << "  wrote " << path << "; reproduce: " << check.reproduceCommand(kind, path) << "\n";
   }

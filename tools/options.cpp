@@ -114,17 +114,19 @@ struct OptionSpec {
 
 const OptionSpec kOptions[] = {
     {"--passes", "LIST", kMain | kRun | kCheck | kCcCheck | kReduce | kFuzz,
-     "run these passes in order (comma-separated) instead of the default pipeline below; --passes= runs none (run: none unless given)",
+     "run these passes in order (comma-separated) instead of the default pipeline below; --passes= runs none "
+     "(run: none unless given)",
      [](Options& options, const std::string& value) {
        options.passes = splitAtCommas(value);
        return std::string();
      }},
     {"--emit", "FORMAT", kMain,
-     "write the result as program text (text, the default), as a Graphviz digraph (dot), as a C99 translation unit (c), or as an HTML report of every step (html)",
+     "write the result as program text (text, the default), as a Graphviz digraph (dot), as a C99 "
+     "translation unit (c), or as an HTML report of every step (html)",
      [](Options& options, const std::string& value) {
-       return parseChoice<Emit>("--emit", value,
-                                {{"text", Emit::Text}, {"dot", Emit::Dot}, {"c", Emit::C}, {"html", Emit::Html}},
-                                options.emit);
+       return parseChoice<Emit>(
+           "--emit", value, {{"text", Emit::Text}, {"dot", Emit::Dot}, {"c", Emit::C}, {"html", Emit::Html}},
+           options.emit);
      }},
     {"-o", "FILE", kMain | kReduce, "write the result to FILE instead of standard output (-o -)",
      [](Options& options, const std::string& value) {
@@ -171,13 +173,15 @@ const OptionSpec kOptions[] = {
        return std::string();
      }},
     {"--verify", nullptr, kMain,
-     "check the graph after every pass with internal checks on; report every internal error and consistency failure and exit with 1",
+     "check the graph after every pass with internal checks on; report every internal error and consistency "
+     "failure and exit with 1",
      [](Options& options, const std::string&) {
        options.verify = true;
        return std::string();
      }},
     {"--stats", nullptr, kMain,
-     "count procedures, blocks, statements and phi functions before and after, constants found and definitions removed",
+     "count procedures, blocks, statements and phi functions before and after, constants found and "
+     "definitions removed",
      [](Options& options, const std::string&) {
        options.stats = true;
        return std::string();
@@ -188,20 +192,24 @@ const OptionSpec kOptions[] = {
        return std::string();
      }},
     {"--steps", "N", kRun | kCheck | kCcCheck | kReduce, "passes of #main per run (default 10)",
-     [](Options& options, const std::string& value) { return parseCount("--steps", value, 1, options.steps); }},
+     [](Options& options, const std::string& value) {
+       return parseCount("--steps", value, 1, options.steps);
+     }},
     {"--runs", "R", kCheck | kCcCheck | kReduce, "runs, each on its own input streams (default 20)",
      [](Options& options, const std::string& value) { return parseCount("--runs", value, 1, options.runs); }},
     {"--seed", "S", kRun | kCheck | kCcCheck | kReduce | kGenerate | kFuzz,
      "seed of the input streams, run r using S + r (default 1); of generate and fuzz, the (first) program",
      [](Options& options, const std::string& value) { return parseCount("--seed", value, 0, options.seed); }},
     {"--inputs", "VALUES", kRun,
-     "run on the values in file VALUES (- for standard input), a line NAME V1 V2 ... per input, instead of seeded streams",
+     "run on the values in file VALUES (- for standard input), a line NAME V1 V2 ... per input, instead of "
+     "seeded streams",
      [](Options& options, const std::string& value) {
        options.inputsPath = value;
        return std::string();
      }},
     {"--match", "TEXT", kReduce,
-     "count a failure as the same only when the command's output shows TEXT (instead of the first line of the original failure)",
+     "count a failure as the same only when the command's output shows TEXT (instead of the first line of "
+     "the original failure)",
      [](Options& options, const std::string& value) {
        options.match = value;
        return std::string();
@@ -213,7 +221,8 @@ const OptionSpec kOptions[] = {
        return parseCount("--programs", value, 1, options.programs);
      }},
     {"--random-passes", nullptr, kFuzz,
-     "take each program through a random order of passes that can run, drawn from its seed, instead of --passes or the default pipeline",
+     "take each program through a random order of passes that can run, drawn from its seed, instead of "
+     "--passes or the default pipeline",
      [](Options& options, const std::string&) {
        options.randomPasses = true;
        return std::string();
@@ -222,7 +231,8 @@ const OptionSpec kOptions[] = {
      "colour diagnostics: auto (when standard error is a terminal, the default), always or never",
      [](Options& options, const std::string& value) {
        return parseChoice<ColourMode>(
-           "--color", value, {{"auto", ColourMode::Auto}, {"always", ColourMode::Always}, {"never", ColourMode::Never}},
+           "--color", value,
+           {{"auto", ColourMode::Auto}, {"always", ColourMode::Always}, {"never", ColourMode::Never}},
            options.colour);
      }},
     {"--help", nullptr, kAll, "show this text",
@@ -285,7 +295,8 @@ private:
 
   // Reduce takes the command after "--"; for the others the arguments after it are files only.
   void endOfOptions(std::size_t& i) {
-    std::vector<std::string> rest(m_Arguments.begin() + static_cast<std::ptrdiff_t>(i) + 1, m_Arguments.end());
+    std::vector<std::string> rest(m_Arguments.begin() + static_cast<std::ptrdiff_t>(i) + 1,
+                                  m_Arguments.end());
     i = m_Arguments.size();
     if (m_Parsed.options.command == Command::Reduce) {
       m_Parsed.options.reduceCommand = std::move(rest);

@@ -29,7 +29,7 @@ inline constexpr std::uint64_t kDefaultPrograms = 100;
 
 struct Options {
   Command command = Command::Transform;
-  std::string inputPath;  // "-": standard input
+  std::string inputPath;                           // "-": standard input
   std::optional<std::vector<std::string>> passes;  // empty when not given: the default pipeline
   Emit emit = Emit::Text;
   std::string outputPath;  // empty or "-": standard output

@@ -16,8 +16,8 @@ namespace ssaopt::tool {
 
 namespace fs = std::filesystem;
 
-Outcome runProcess(const std::vector<std::string>& arguments, const fs::path& input, const fs::path& directory,
-                   std::chrono::milliseconds timeout) {
+Outcome runProcess(const std::vector<std::string>& arguments, const fs::path& input,
+                   const fs::path& directory, std::chrono::milliseconds timeout) {
   fs::path outPath = directory / "stdout", errPath = directory / "stderr";
   posix_spawn_file_actions_t actions;
   posix_spawn_file_actions_init(&actions);

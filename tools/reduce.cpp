@@ -12,11 +12,11 @@
 #include "passes.h"
 #include "process.h"
 #include "shrink.h"
-#include "text.h"
 #include "ssaopt/client/front_end.h"
 #include "ssaopt/client/printer.h"
 #include "ssaopt/frame/control.h"
 #include "ssaopt/frame/pool.h"
+#include "text.h"
 
 namespace ssaopt::tool {
 
@@ -102,9 +102,9 @@ private:
     }
     m_Candidate = (m_Directory.path() / candidateName()).string();
     if (!findFailure(text)) return kFailure;
-    std::string smallest = shrinkProgram(startingPoint(text), [this](const std::string& candidate) {
-      return failsTheSameWay(candidate);
-    }, kAttempts);
+    std::string smallest = shrinkProgram(
+        startingPoint(text), [this](const std::string& candidate) { return failsTheSameWay(candidate); },
+        kAttempts);
     m_Err << "ssaopt: reduce: " << lineCount(smallest) << " of " << lineCount(text) << " lines left after "
           << m_Runs << " runs of " << m_CommandName << "\n";
     return write(smallest) ? kSuccess : kFailure;
@@ -118,8 +118,8 @@ private:
       m_Command = m_Options.reduceCommand;
       m_CommandName = "'" + m_Command.front() + "'";
       if (recordFailure(text)) return true;
-      m_Err << "ssaopt: reduce: " << m_CommandName << " does not fail on " << client::displayName(m_Options.inputPath)
-            << "\n";
+      m_Err << "ssaopt: reduce: " << m_CommandName << " does not fail on "
+            << client::displayName(m_Options.inputPath) << "\n";
       return false;
     }
     for (const char* name : kDefaultCommands) {

@@ -24,11 +24,16 @@ constexpr std::chrono::seconds kPictureTimeout{60};
 std::string escaped(const std::string& text) {
   std::string html;
   for (char c : text) {
-    if (c == '&') html += "&amp;";
-    else if (c == '<') html += "&lt;";
-    else if (c == '>') html += "&gt;";
-    else if (c == '"') html += "&quot;";
-    else html += c;
+    if (c == '&')
+      html += "&amp;";
+    else if (c == '<')
+      html += "&lt;";
+    else if (c == '>')
+      html += "&gt;";
+    else if (c == '"')
+      html += "&quot;";
+    else
+      html += c;
   }
   return html;
 }
@@ -93,9 +98,10 @@ public:
 
   std::string html(const std::string& beforeName, const std::string& afterName) {
     std::vector<DiffLine> script = diffLines(m_Before, m_After);
-    m_Html << "<table class=\"diff\"><colgroup><col style=\"width:3.5em\"><col><col style=\"width:3.5em\"><col>"
-              "</colgroup><tr><th colspan=\"2\">"
-           << escaped(beforeName) << "</th><th colspan=\"2\">" << escaped(afterName) << "</th></tr>\n";
+    m_Html
+        << "<table class=\"diff\"><colgroup><col style=\"width:3.5em\"><col><col style=\"width:3.5em\"><col>"
+           "</colgroup><tr><th colspan=\"2\">"
+        << escaped(beforeName) << "</th><th colspan=\"2\">" << escaped(afterName) << "</th></tr>\n";
     for (std::size_t i = 0; i < script.size();) {
       std::size_t end = i;
       bool same = script[i].kind == Kind::Same;
@@ -112,7 +118,8 @@ public:
 
 private:
   // Lines further than kContext from a change are folded, unless that hides only a line or two.
-  void unchangedRun(const std::vector<DiffLine>& script, std::size_t from, std::size_t to, bool first, bool last) {
+  void unchangedRun(const std::vector<DiffLine>& script, std::size_t from, std::size_t to, bool first,
+                    bool last) {
     std::size_t keepBefore = first ? 0 : kContext, keepAfter = last ? 0 : kContext;
     bool folds = to - from > keepBefore + keepAfter + 2;
     for (std::size_t i = from; i < to; ++i) {
@@ -146,7 +153,8 @@ private:
   static std::string blank() { return "<td class=\"number\"></td><td class=\"blank\"></td>"; }
 
   void row(const char* cssClass, const std::string& cells) {
-    m_Html << "<tr" << (*cssClass ? std::string(" class=\"") + cssClass + "\"" : "") << ">" << cells << "</tr>\n";
+    m_Html << "<tr" << (*cssClass ? std::string(" class=\"") + cssClass + "\"" : "") << ">" << cells
+           << "</tr>\n";
   }
 
   std::vector<std::string> m_Before;
@@ -185,16 +193,18 @@ std::string Report::pictureOf(const client::Program& program) {
   Outcome outcome = runProcess({"dot", "-Tsvg"}, input, directory.path(), kPictureTimeout);
   if (!outcome.started) m_PictureNote = "no pictures: Graphviz's dot is not installed";
   if (outcome.started && outcome.status != 0) m_PictureNote = "no pictures: dot failed: " + outcome.err;
-  return outcome.started && outcome.status == 0 ? inlineSvg(outcome.out, "step" + std::to_string(m_Steps.size()))
-                                                 : "";
+  return outcome.started && outcome.status == 0
+             ? inlineSvg(outcome.out, "step" + std::to_string(m_Steps.size()))
+             : "";
 }
 
 std::string Report::page(const std::string& statistics, const std::string& times) const {
   std::string file = client::displayName(m_Options.inputPath);
   std::ostringstream html;
   html << "<!DOCTYPE html>\n<html lang=\"en\">\n<head>\n<meta charset=\"utf-8\">\n<title>ssaopt: "
-       << escaped(file) << "</title>\n<style>" << kStyle << "</style>\n</head>\n<body>\n<h1>ssaopt: "
-       << escaped(file) << "</h1>\n<p><label><input type=\"checkbox\" id=\"expand\"> show unchanged lines</label> "
+       << escaped(file) << "</title>\n<style>" << kStyle
+       << "</style>\n</head>\n<body>\n<h1>ssaopt: " << escaped(file)
+       << "</h1>\n<p><label><input type=\"checkbox\" id=\"expand\"> show unchanged lines</label> "
        << "<label><input type=\"checkbox\" id=\"changed-only\"> only steps that changed the program</label> "
        << "<span class=\"note\">(j and k: next and previous step)</span></p>\n";
   if (!m_PictureNote.empty()) html << "<p class=\"note\">" << escaped(m_PictureNote) << "</p>\n";
@@ -204,7 +214,8 @@ std::string Report::page(const std::string& statistics, const std::string& times
     html << "<li" << (changed ? "" : " class=\"unchanged\"") << "><a href=\"#step-" << i << "\">"
          << escaped(m_Steps[i].name) << "</a>" << (changed ? "" : " (no change)") << "</li>\n";
   }
-  html << "</ol></nav>\n<h2>Figures</h2>\n<pre>" << escaped(statistics) << "\n" << escaped(times) << "</pre>\n";
+  html << "</ol></nav>\n<h2>Figures</h2>\n<pre>" << escaped(statistics) << "\n"
+       << escaped(times) << "</pre>\n";
   for (std::size_t i = 0; i < m_Steps.size(); ++i) html << stepSection(i);
   html << "<script>" << kScript << "</script>\n</body>\n</html>\n";
   return html.str();
@@ -215,8 +226,8 @@ std::string Report::stepSection(std::size_t i) const {
   bool changed = i == 0 || step.text != m_Steps[i - 1].text;
   std::ostringstream html;
   html << "<section class=\"step" << (changed ? "" : " unchanged") << "\" id=\"step-" << i << "\">\n<h2>" << i
-       << ". " << escaped(step.name) << (i == 0 ? "" : " <small>" + milliseconds(step.milliseconds) + "</small>")
-       << "</h2>\n";
+       << ". " << escaped(step.name)
+       << (i == 0 ? "" : " <small>" + milliseconds(step.milliseconds) + "</small>") << "</h2>\n";
   if (i == 0)
     html << "<pre>" << escaped(step.text) << "</pre>\n";
   else if (changed)

@@ -39,7 +39,8 @@ std::vector<DiffLine> backtrack(const Trace& trace, const Middle& middle) {
   std::vector<DiffLine> reversed;
   long x = static_cast<long>(middle.aTo - middle.aFrom), y = static_cast<long>(middle.bTo - middle.bFrom);
   auto same = [&](long i, long j) {
-    reversed.push_back({Kind::Same, middle.aFrom + static_cast<std::size_t>(i), middle.bFrom + static_cast<std::size_t>(j)});
+    reversed.push_back(
+        {Kind::Same, middle.aFrom + static_cast<std::size_t>(i), middle.bFrom + static_cast<std::size_t>(j)});
   };
   for (long d = static_cast<long>(trace.size()) - 1; d > 0; --d) {
     const std::vector<long>& previous = trace[static_cast<std::size_t>(d - 1)];
@@ -75,7 +76,8 @@ std::optional<std::vector<DiffLine>> shortestEdit(const Middle& middle) {
       long x = (k == -d || (k != d && v(k - 1) < v(k + 1))) ? v(k + 1) : v(k - 1) + 1;
       long y = x - k;
       while (x < n && y < m &&
-             middle.a[middle.aFrom + static_cast<std::size_t>(x)] == middle.b[middle.bFrom + static_cast<std::size_t>(y)])
+             middle.a[middle.aFrom + static_cast<std::size_t>(x)] ==
+                 middle.b[middle.bFrom + static_cast<std::size_t>(y)])
         ++x, ++y;
       v(k) = x;
       reached = x >= n && y >= m;
@@ -114,7 +116,8 @@ std::string replacedAll(std::string text, const std::string& what, const std::st
   return text;
 }
 
-std::vector<DiffLine> diffLines(const std::vector<std::string>& before, const std::vector<std::string>& after) {
+std::vector<DiffLine> diffLines(const std::vector<std::string>& before,
+                                const std::vector<std::string>& after) {
   std::unordered_map<std::string_view, std::size_t> ids;
   std::vector<std::size_t> a = numbered(before, ids), b = numbered(after, ids);
   std::size_t prefix = 0, suffix = 0;

@@ -27,7 +27,8 @@ struct DiffLine {
 // Past kMaxEditDistance changes it gives up on the middle part that differs and shows it removed and
 // added whole, so that two very different large texts take linear time.
 inline constexpr std::size_t kMaxEditDistance = 2000;
-std::vector<DiffLine> diffLines(const std::vector<std::string>& before, const std::vector<std::string>& after);
+std::vector<DiffLine> diffLines(const std::vector<std::string>& before,
+                                const std::vector<std::string>& after);
 
 // "--- beforeName", "+++ afterName", then hunks with three lines of context; empty when the texts are
 // the same.

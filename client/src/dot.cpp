@@ -141,7 +141,8 @@ private:
       if (m_Options.showValues && pBlock && !pInfo->isEdgeExecutable()) attributes.push_back(kNotExecutable);
       writeEdge(box, idOf(m_Graph.target(e)), attributes);
     }
-    if (pBlock && pBlock->getBranchCond() && !(onTrue && onFalse)) writeRemovedBranch(box, onTrue ? "F" : "T");
+    if (pBlock && pBlock->getBranchCond() && !(onTrue && onFalse))
+      writeRemovedBranch(box, onTrue ? "F" : "T");
   }
 
   void writeRemovedBranch(node box, const char* branch) {
@@ -172,7 +173,7 @@ private:
   const DotOptions& m_Options;
   std::ostringstream m_Out;
   std::ostringstream m_Edges;
-  node m_Exit;  // of the procedure being written
+  node m_Exit;                                      // of the procedure being written
   std::unordered_map<std::uint32_t, node> m_BoxOf;  // by node index: the first block of its box
 };
 

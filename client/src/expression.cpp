@@ -120,8 +120,9 @@ bool KvCCfgSFExpression::generatesSameCodeAs(const KvCCfgSFExpression& other) co
     const Term& theirs = other.m_Terms[i];
     if (mine.op != theirs.op) return false;
     if (mine.op == TermOp::Literal && !sameNumber(mine.number, theirs.number)) return false;
-    if (ssaopt::client::namesVariable(mine.op) && ssaopt::client::versionReadAfterHoisting(mine.pVariable) !=
-                                                      ssaopt::client::versionReadAfterHoisting(theirs.pVariable))
+    if (ssaopt::client::namesVariable(mine.op) &&
+        ssaopt::client::versionReadAfterHoisting(mine.pVariable) !=
+            ssaopt::client::versionReadAfterHoisting(theirs.pVariable))
       return false;
   }
   return true;

@@ -40,8 +40,9 @@ private:
       if (label.text.empty()) continue;
       auto inserted = m_Labels.emplace(label.text, static_cast<int>(i));
       if (!inserted.second)
-        m_State.diagnostics.error(label.pos, "label " + quoted(label.text) + " is already used at line " +
-                                                 std::to_string(syntax.blocks[inserted.first->second].label.pos.line));
+        m_State.diagnostics.error(label.pos,
+                                  "label " + quoted(label.text) + " is already used at line " +
+                                      std::to_string(syntax.blocks[inserted.first->second].label.pos.line));
     }
   }
 

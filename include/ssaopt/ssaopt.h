@@ -1,6 +1,9 @@
 // Umbrella header: the whole public interface of the library.
 #pragma once
 
+#include "ssaopt/cfg/control_flow_graph.h"
+#include "ssaopt/cfg/graph_state.h"
+#include "ssaopt/cfg/pipeline.h"
 #include "ssaopt/frame/containers.h"
 #include "ssaopt/frame/control.h"
 #include "ssaopt/frame/graph.h"
@@ -10,8 +13,6 @@
 #include "ssaopt/frame/report.h"
 #include "ssaopt/frame/string.h"
 #include "ssaopt/frame/types.h"
-#include "ssaopt/values/arithmetic.h"
-#include "ssaopt/values/value.h"
 #include "ssaopt/ir/dominator_tree.h"
 #include "ssaopt/ir/edge_info.h"
 #include "ssaopt/ir/expression.h"
@@ -21,6 +22,5 @@
 #include "ssaopt/ir/statement.h"
 #include "ssaopt/ir/variable.h"
 #include "ssaopt/ir/variable_expression.h"
-#include "ssaopt/cfg/control_flow_graph.h"
-#include "ssaopt/cfg/graph_state.h"
-#include "ssaopt/cfg/pipeline.h"
+#include "ssaopt/values/arithmetic.h"
+#include "ssaopt/values/value.h"

@@ -362,7 +362,6 @@ private:
       pVariable->setVarRange(minimum, maximum);
   }
 
-
   void registerOperands(std::size_t merge) {
     const PhiMerge& phiMerge = m_Merges[merge];
     for (std::size_t i = 0; i < phiMerge.operands().size(); ++i)

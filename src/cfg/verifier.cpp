@@ -147,8 +147,10 @@ private:
     KvCCfgNodeInfo* pInf = m_G.inf(v);
     if (KvCBasicBlock* pBlock = pInf ? pInf->isBasicBlock() : nullptr)
       return text + " (bb" + std::to_string(pBlock->getIndex()) + ")";
-    if (pInf && pInf->isEntryNode()) return text + " (the entry of '" + nameOf(pInf->getProcedure()).c_str() + "')";
-    if (pInf && pInf->isExitNode()) return text + " (the exit of '" + nameOf(pInf->getProcedure()).c_str() + "')";
+    if (pInf && pInf->isEntryNode())
+      return text + " (the entry of '" + nameOf(pInf->getProcedure()).c_str() + "')";
+    if (pInf && pInf->isExitNode())
+      return text + " (the exit of '" + nameOf(pInf->getProcedure()).c_str() + "')";
     return text;
   }
 
@@ -169,8 +171,8 @@ private:
       }
       KvCCfgProcedure*& owner = ownerOf[static_cast<std::size_t>(component[entry])];
       if (owner)
-        violation(kComponents, "one component per procedure: '%s' and '%s' are connected", nameOf(owner).c_str(),
-                  nameOf(pProcedure).c_str());
+        violation(kComponents, "one component per procedure: '%s' and '%s' are connected",
+                  nameOf(owner).c_str(), nameOf(pProcedure).c_str());
       else
         owner = pProcedure;
     }

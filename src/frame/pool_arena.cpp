@@ -96,7 +96,8 @@ void PoolArena::end(PoolArena* arena, bool reportGraphs) {
   if (arena->m_Holds == 0) {
     delete arena;
   } else {
-    if (reportGraphs) reportPoolMisuse(kCodeGraphOutlivesPool, "no graph holds blocks of a memory pool that ends");
+    if (reportGraphs)
+      reportPoolMisuse(kCodeGraphOutlivesPool, "no graph holds blocks of a memory pool that ends");
     arena->m_pNextRetired = s_pRetired;
     s_pRetired = arena;
   }
@@ -141,7 +142,8 @@ PoolArena::~PoolArena() {
 }
 
 void* PoolArena::allocate(std::size_t size) {
-  if (size > std::numeric_limits<std::size_t>::max() - sizeof(LargeBlock) - sizeof(Header)) throw std::bad_alloc();
+  if (size > std::numeric_limits<std::size_t>::max() - sizeof(LargeBlock) - sizeof(Header))
+    throw std::bad_alloc();
   std::size_t sizeClass = (size + sizeof(Header) + kGranule - 1) / kGranule;
   bool small = kPoolsSmallBlocks && sizeClass <= kClasses;
   Header* header = small ? takeSmall(sizeClass) : takeLarge(size);

@@ -23,7 +23,8 @@ std::string formatHostMessage(int number, std::va_list args) {
     return "Host message " + std::to_string(number) + ".";
   const char* className = va_arg(args, const char*);
   int line = va_arg(args, int);
-  std::string text = "Internal error. Error code: " + std::string(className ? className : "") + std::to_string(line);
+  std::string text =
+      "Internal error. Error code: " + std::string(className ? className : "") + std::to_string(line);
   if (number == kKvMessageInternalErrorWithDetail) {
     const char* detail = va_arg(args, const char*);
     text += ": " + std::string(detail ? detail : "");
@@ -88,7 +89,8 @@ void reportInternalError(const char* className, int line) {
 }
 
 void reportInternalError(const char* className, int line, const char* detail) {
-  ERR_EmitErrorMessage(kKvErrorKindInternal, nullptr, kKvMessageInternalErrorWithDetail, className, line, detail);
+  ERR_EmitErrorMessage(kKvErrorKindInternal, nullptr, kKvMessageInternalErrorWithDetail, className, line,
+                       detail);
 }
 
 void reportConsistencyFailure(const char* file, int line, const char* condition) {

@@ -110,7 +110,8 @@ inline void expectInvariants(const KvCControlFlowGraph& G) {
   ssaopt::ReportLog log;
   bool holds = G.verify();
   std::string reports;
-  for (const ssaopt::ReportLog::Consistency& failure : log.consistencyFailures()) reports += failure.condition + "\n";
+  for (const ssaopt::ReportLog::Consistency& failure : log.consistencyFailures())
+    reports += failure.condition + "\n";
   EXPECT_TRUE(holds) << reports;
 }
 

@@ -2,13 +2,14 @@
 // step contracts before anything runs), what a pipeline does when a step is not ready, and the
 // helpers for reading a graph back. Programs through the pipeline are tested with the client
 // (tests/filetests/pipeline, tests/golden).
+#include "ssaopt/cfg/pipeline.h"
+
 #include <gtest/gtest.h>
 
 #include <string>
 #include <vector>
 
 #include "cfg/propagation_testing.h"
-#include "ssaopt/cfg/pipeline.h"
 #include "ssaopt/frame/report.h"
 
 using namespace sccptest;
@@ -39,9 +40,10 @@ TEST(PipelineOrders, TheTypicalRunAndItsVariantsCanRun) {
 }
 
 TEST(PipelineOrders, AStepThatIsNotReadyNamesTheStepThatTookWhatItNeeds) {
-  EXPECT_EQ(problemOf({"ssa", "ssa-edges", "divide"}),
-            "pass 'divide' cannot run after 'ssa-edges': SSA edges are present (dividing would leave every SSA "
-            "edge of a block on the last block of its chain)");
+  EXPECT_EQ(
+      problemOf({"ssa", "ssa-edges", "divide"}),
+      "pass 'divide' cannot run after 'ssa-edges': SSA edges are present (dividing would leave every SSA "
+      "edge of a block on the last block of its chain)");
   EXPECT_EQ(problemOf({"divide", "ssa", "sccp"}),
             "pass 'sccp' needs 'divide' again after 'ssa': blocks are not divided (a visit takes one phi "
             "function, one statement or one condition per block)");

@@ -66,8 +66,8 @@ inline KvCPhiFunction* phiFunction(KvCCfgVariable* pVariable, const std::vector<
 }
 
 // The graphs are built in SSA form and divided by hand, and say so.
-inline constexpr ssaopt::GraphState kBuiltInSSAForm{ssaopt::GraphFact::ExitsPlaced, ssaopt::GraphFact::SSAForm,
-                                                    ssaopt::GraphFact::Divided};
+inline constexpr ssaopt::GraphState kBuiltInSSAForm{ssaopt::GraphFact::ExitsPlaced,
+                                                    ssaopt::GraphFact::SSAForm, ssaopt::GraphFact::Divided};
 
 class PropagationTest : public cfgtest::CfgTest {
 protected:

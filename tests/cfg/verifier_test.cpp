@@ -56,7 +56,8 @@ protected:
   // What the reports say, for the tests that check the wording.
   std::string text() const {
     std::string all;
-    for (const ssaopt::ReportLog::Consistency& failure : m_Log.consistencyFailures()) all += failure.condition + "\n";
+    for (const ssaopt::ReportLog::Consistency& failure : m_Log.consistencyFailures())
+      all += failure.condition + "\n";
     return all;
   }
 
@@ -64,8 +65,8 @@ protected:
   // The node whose block holds the phi function of `pVersion` alone.
   node definitionOf(KvCCfgVariable* pVersion) {
     for (node v : G.nodes())
-      if (KvCBasicBlock* pBlock = G.getBasicBlock(v); pBlock && pBlock->isPhiFunction() &&
-                                                      pBlock->isPhiFunction()->getVariable() == pVersion)
+      if (KvCBasicBlock* pBlock = G.getBasicBlock(v);
+          pBlock && pBlock->isPhiFunction() && pBlock->isPhiFunction()->getVariable() == pVersion)
         return v;
     return ssaopt::nil;
   }

@@ -10,7 +10,8 @@ class FrontEndLimits : public clienttest::ClientTest {};
 TEST_F(FrontEndLimits, ExpressionsNestedTooDeeplyAreRejectedNotOverflowed) {
   std::string deep(1001, '(');
   std::string line = "  x = " + deep + "1" + std::string(1001, ')') + ";";
-  ssaopt::client::LoadResult result = ssaopt::client::loadProgram("var int16 x;\nproc #main {\n" + line + "\n}\n");
+  ssaopt::client::LoadResult result =
+      ssaopt::client::loadProgram("var int16 x;\nproc #main {\n" + line + "\n}\n");
   ASSERT_EQ(result.diagnostics.size(), 1u);
   EXPECT_EQ(result.program, nullptr);
   const ssaopt::client::Diagnostic& error = result.diagnostics[0];

@@ -12,8 +12,8 @@
 
 namespace {
 
-using ssaopt::client::Program;
 using ssaopt::node;
+using ssaopt::client::Program;
 
 const char* const kProgram =
     "var int16 in volatile;\n"
@@ -60,60 +60,88 @@ struct OutOfOrder {
 void PrintTo(const OutOfOrder& call, std::ostream* out) { *out << call.name; }
 
 const OutOfOrder kCalls[] = {
-    {"MakeProcedureAndCallAfterExits", {},
+    {"MakeProcedureAndCallAfterExits",
+     {},
      [](Program& program) { program.graph().makeProcedureAndCall(blockWith(program, 2)); },
      "makeProcedureAndCall: exit nodes are placed"},
-    {"SetParametersOfCallInSSAForm", {"ssa"},
+    {"SetParametersOfCallInSSAForm",
+     {"ssa"},
      [](Program& program) {
        ssaopt::list<KvCCfgVariable*> formals{program.findVariable("p")};
        ssaopt::list<KvCCfgExpression*> arguments{program.expressions().make({}, {})};
        program.graph().setParametersOfCall(firstCall(program), formals, arguments);
      },
      "setParametersOfCall: the graph is in SSA form"},
-    {"PlaceExitNodesTwice", {}, [](Program& program) { program.graph().placeExitNodes(); },
+    {"PlaceExitNodesTwice",
+     {},
+     [](Program& program) { program.graph().placeExitNodes(); },
      "placeExitNodes: exit nodes are placed"},
-    {"PlaceLoopAroundMainTwice", {}, [](Program& program) { program.graph().placeLoopAroundMain(); },
+    {"PlaceLoopAroundMainTwice",
+     {},
+     [](Program& program) { program.graph().placeLoopAroundMain(); },
      "placeLoopAroundMain: \"#main\" is closed into a loop"},
-    {"SplitAtStatementWithSSAEdges", {"ssa", "ssa-edges"},
+    {"SplitAtStatementWithSSAEdges",
+     {"ssa", "ssa-edges"},
      [](Program& program) {
        node v = blockWith(program, 2);
        program.graph().splitAtStatement(v, program.graph().getBasicBlock(v)->getStatementSeq().back());
      },
      "splitAtStatement and splitAtCondition: SSA edges are present"},
-    {"SplitAtConditionWithSSAEdges", {"ssa", "ssa-edges"},
+    {"SplitAtConditionWithSSAEdges",
+     {"ssa", "ssa-edges"},
      [](Program& program) { program.graph().splitAtCondition(blockWith(program, 2)); },
      "splitAtStatement and splitAtCondition: SSA edges are present"},
-    {"DivideAfterSSAEdges", {"ssa", "ssa-edges"}, [](Program& program) { program.graph().divideBasicBlock(); },
+    {"DivideAfterSSAEdges",
+     {"ssa", "ssa-edges"},
+     [](Program& program) { program.graph().divideBasicBlock(); },
      "divideBasicBlock: SSA edges are present"},
-    {"InlineInSSAForm", {"ssa"}, [](Program& program) { program.graph().inlineProcedures(); },
+    {"InlineInSSAForm",
+     {"ssa"},
+     [](Program& program) { program.graph().inlineProcedures(); },
      "inlineProcedures: the graph is in SSA form"},
-    {"ValidConditionsAfterPropagation", {"ssa", "divide", "sccp"},
+    {"ValidConditionsAfterPropagation",
+     {"ssa", "divide", "sccp"},
      [](Program& program) { program.graph().insertValidConditionAssignments(); },
      "insertValidConditionAssignments: the graph is in SSA form"},
-    {"CompleteCallListsInSSAForm", {"ssa"}, [](Program& program) { program.graph().completeCallLists(); },
+    {"CompleteCallListsInSSAForm",
+     {"ssa"},
+     [](Program& program) { program.graph().completeCallLists(); },
      "completeCallLists: the graph is in SSA form"},
-    {"TransformToSSAFormTwice", {"ssa"}, [](Program& program) { program.graph().transformToSSAForm(); },
+    {"TransformToSSAFormTwice",
+     {"ssa"},
+     [](Program& program) { program.graph().transformToSSAForm(); },
      "transformToSSAForm: the graph is in SSA form"},
-    {"TransformToSSAFormWithCallsUnregistered", {},
+    {"TransformToSSAFormWithCallsUnregistered",
+     {},
      [](Program& program) { program.graph().transformToSSAForm(); },
      "transformToSSAForm: a call is not registered in its procedure's call list"},
-    {"PlacePhiFunctionInSSAForm", {"ssa"}, [](Program& program) { program.graph().placePhiFunction(); },
+    {"PlacePhiFunctionInSSAForm",
+     {"ssa"},
+     [](Program& program) { program.graph().placePhiFunction(); },
      "placePhiFunction: the graph is in SSA form"},
-    {"AddSSAEdgesBeforeSSAForm", {}, [](Program& program) { program.graph().addSSAEdges(); },
+    {"AddSSAEdgesBeforeSSAForm",
+     {},
+     [](Program& program) { program.graph().addSSAEdges(); },
      "addSSAEdges: the graph is not in SSA form"},
-    {"PropagateOverSSAEdgesUndivided", {"ssa", "ssa-edges"},
+    {"PropagateOverSSAEdgesUndivided",
+     {"ssa", "ssa-edges"},
      [](Program& program) { program.graph().sparseConditionalConstant(true); },
      "sparseConditionalConstant: blocks are not divided"},
-    {"PropagateWithoutSSAEdges", {"ssa", "divide"},
+    {"PropagateWithoutSSAEdges",
+     {"ssa", "divide"},
      [](Program& program) { program.graph().sparseConditionalConstant(false); },
      "sparseConditionalConstant: there are no SSA edges"},
-    {"PropagateSparseConditionalConstantUndivided", {"ssa"},
+    {"PropagateSparseConditionalConstantUndivided",
+     {"ssa"},
      [](Program& program) { program.graph().propagateSparseConditionalConstant(true); },
      "propagateSparseConditionalConstant: blocks are not divided"},
-    {"PropagateBeforeSSAForm", {"divide"},
+    {"PropagateBeforeSSAForm",
+     {"divide"},
      [](Program& program) { program.graph().propagateSparseConditionalConstant(false); },
      "propagateSparseConditionalConstant: the graph is not in SSA form"},
-    {"RemoveUnusedBeforeSSAForm", {}, [](Program& program) { program.graph().removeUnusedVarDefs(); },
+    {"RemoveUnusedBeforeSSAForm",
+     {},
+     [](Program& program) { program.graph().removeUnusedVarDefs(); },
      "removeUnusedVarDefs: the graph is not in SSA form"},
 };
 
@@ -132,9 +160,8 @@ TEST_P(StepOutOfOrder, ReportsAndLeavesTheGraphAsItWas) {
   GetParam().step(*pProgram);
 
   ASSERT_EQ(log.messages().size(), 1u);
-  EXPECT_EQ(log.messages()[0].rfind(std::string("Internal error. Error code: KvCControlFlowGraph4000: ") +
-                                        GetParam().refusal,
-                                    0),
+  EXPECT_EQ(log.messages()[0].rfind(
+                std::string("Internal error. Error code: KvCControlFlowGraph4000: ") + GetParam().refusal, 0),
             0u)
       << log.messages()[0];
   EXPECT_EQ(ssaopt::client::printProgram(*pProgram), printed);
@@ -161,8 +188,8 @@ TEST_F(StepsInOrder, TheStepsOfTheTypicalRunLeaveTheStateTheyPromise) {
     EXPECT_EQ(pProgram->graph().getState(), expected) << pStep->name;
   }
   using F = ssaopt::GraphFact;
-  EXPECT_EQ(expected, ssaopt::GraphState({F::ExitsPlaced, F::LoopAroundMain, F::SSAForm, F::Divided,
-                                          F::Propagated}));
+  EXPECT_EQ(expected,
+            ssaopt::GraphState({F::ExitsPlaced, F::LoopAroundMain, F::SSAForm, F::Divided, F::Propagated}));
 }
 
 }  // namespace

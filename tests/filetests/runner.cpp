@@ -50,7 +50,8 @@ struct Check {
 struct TestFile {
   std::vector<std::string> lines;
   std::vector<std::string> runs;
-  std::vector<std::string> requires;
+  std::vector<std::string>
+  requires;
   int status = 0;
   std::vector<Check> checks;
 };
@@ -71,7 +72,8 @@ std::vector<std::string> splitLines(const std::string& text) {
 
 // The directive of a comment line ("RUN", "CHECK-NEXT", ...) and the text after its colon.
 std::optional<std::pair<std::string, std::string>> directiveOf(const std::string& line) {
-  static const std::regex kDirective(R"(^\s*//\s*(RUN|EXIT|REQUIRES|CHECK|CHECK-NEXT|CHECK-EMPTY|CHECK-NOT):(.*)$)");
+  static const std::regex kDirective(
+      R"(^\s*//\s*(RUN|EXIT|REQUIRES|CHECK|CHECK-NEXT|CHECK-EMPTY|CHECK-NOT):(.*)$)");
   std::smatch match;
   if (!std::regex_match(line, match, kDirective)) return std::nullopt;
   std::string text = match[2];
@@ -125,7 +127,9 @@ Pattern compile(const std::string& text, const std::map<std::string, std::string
   std::vector<std::string> names;
   for (std::size_t i = 0; i < text.size();) {
     bool braces = text.compare(i, 2, "{{") == 0, brackets = text.compare(i, 2, "[[") == 0;
-    std::size_t close = braces ? text.find("}}", i + 2) : brackets ? text.find("]]", i + 2) : std::string::npos;
+    std::size_t close = braces     ? text.find("}}", i + 2)
+                        : brackets ? text.find("]]", i + 2)
+                                   : std::string::npos;
     if (close == std::string::npos) {
       regex += escapedForRegex(text.substr(i, 1));
       ++i;
@@ -178,7 +182,8 @@ public:
 private:
   std::optional<std::size_t> find(const Check& check, std::size_t from) {
     if (check.kind == Check::Kind::Empty)
-      return from < m_Output.size() && m_Output[from].empty() ? std::optional<std::size_t>(from) : std::nullopt;
+      return from < m_Output.size() && m_Output[from].empty() ? std::optional<std::size_t>(from)
+                                                              : std::nullopt;
     std::size_t to = check.kind == Check::Kind::Next ? std::min(from + 1, m_Output.size()) : m_Output.size();
     return match(check, from, to, true);
   }
@@ -251,7 +256,8 @@ public:
                                    quoted((m_Temporary / "t").string()));
     fs::path errPath = m_Temporary / "stderr";
     std::string shell = "PATH=" + quoted(m_ToolDirectory.string()) + ":\"$PATH\"; export PATH; cd " +
-                        quoted(m_File.parent_path().string()) + " && (" + line + ") 2>" + quoted(errPath.string());
+                        quoted(m_File.parent_path().string()) + " && (" + line + ") 2>" +
+                        quoted(errPath.string());
     RunResult result{-1, "", ""};
     std::FILE* pPipe = popen(shell.c_str(), "r");
     if (!pPipe) return result;
@@ -315,8 +321,9 @@ int update(const Runner& runner, const TestFile& file, const fs::path& path) {
   for (const std::string& line : output) {
     bool first = checks.empty();
     if (first && line.empty()) continue;
-    checks.push_back(line.empty() ? "// CHECK-EMPTY:"
-                                  : std::string(first ? "// CHECK: " : "// CHECK-NEXT: ") + generalised(line));
+    checks.push_back(line.empty()
+                         ? "// CHECK-EMPTY:"
+                         : std::string(first ? "// CHECK: " : "// CHECK-NEXT: ") + generalised(line));
   }
   std::vector<std::string> lines;
   bool placed = false;

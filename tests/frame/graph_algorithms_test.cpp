@@ -1,8 +1,8 @@
+#include "ssaopt/frame/graph_algorithms.h"
+
 #include <gtest/gtest.h>
 
 #include <vector>
-
-#include "ssaopt/frame/graph_algorithms.h"
 
 using namespace ssaopt;
 

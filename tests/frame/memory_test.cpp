@@ -283,7 +283,9 @@ TEST_P(GraphOutlivingItsPool, TheModulesOwnPool) {
 }
 
 INSTANTIATE_TEST_SUITE_P(InternalInformation, GraphOutlivingItsPool, ::testing::Bool(),
-                         [](const ::testing::TestParamInfo<bool>& param) { return param.param ? "On" : "Off"; });
+                         [](const ::testing::TestParamInfo<bool>& param) {
+                           return param.param ? "On" : "Off";
+                         });
 
 TEST(PoolController, ABlockThatNoPoolHandedOutIsReportedAndLeftAlone) {
   ReportLog log;

@@ -108,8 +108,9 @@ TEST(ToolRun, InputValuesForWhatIsNotAnInputAreAnError) {
   EXPECT_EQ(unknown.err, "ssaopt: " + misspelt + ": 'tabel' is not a variable of the program\n");
   EXPECT_EQ(unknown.out, "");
   std::string notInput = fileWith("total", "total 1 2\n");
-  EXPECT_EQ(ssaopt("run " + example("loop") + " --inputs " + notInput).err,
-            "ssaopt: " + notInput + ": 'total' is not an input of the program (neither volatile nor an array)\n");
+  EXPECT_EQ(
+      ssaopt("run " + example("loop") + " --inputs " + notInput).err,
+      "ssaopt: " + notInput + ": 'total' is not an input of the program (neither volatile nor an array)\n");
 }
 
 TEST(ToolRun, InputValuesComeFromStandardInputToo) {

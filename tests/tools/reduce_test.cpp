@@ -69,7 +69,8 @@ TEST(ToolReduce, ShrinksWhileTheCommandFailsTheSameWay) {
 
 TEST(ToolReduce, MatchKeepsTheFailuresThatShowTheText) {
   std::string tool = executable("tool.sh", kSabotagedTool);
-  Result result = ssaopt("reduce " + fileWith("program.ssa", kProgram) + " --match=crashed -- " + tool + " {}");
+  Result result =
+      ssaopt("reduce " + fileWith("program.ssa", kProgram) + " --match=crashed -- " + tool + " {}");
   EXPECT_EQ(result.status, 0) << result.err;
   // Either crash counts, so the smallest program keeps only one of them.
   EXPECT_LE(std::count(result.out.begin(), result.out.end(), '\n'), 6) << result.out;
@@ -92,10 +93,11 @@ TEST(ToolReduce, AProgramWithErrorsIsNotReduced) {
 // the original program give one more (as in cc_check_test.cpp). The program shrinks to what shows it.
 TEST(ToolReduce, ByDefaultCcCheckFailsOnASabotagedCompiler) {
   if (std::system("command -v cc >/dev/null 2>&1") != 0) GTEST_SKIP() << "no C compiler (cc) installed";
-  std::string compiler = executable(
-      "cc", "#!/bin/sh\n"
-            "for a; do case $a in *original.c) sed -i 's/: a \\* b;/: a * b + 1.0;/' $a;; esac; done\n"
-            "exec cc \"$@\"\n");
+  std::string compiler =
+      executable("cc",
+                 "#!/bin/sh\n"
+                 "for a; do case $a in *original.c) sed -i 's/: a \\* b;/: a * b + 1.0;/' $a;; esac; done\n"
+                 "exec cc \"$@\"\n");
   std::string program = fileWith("program.ssa",
                                  "var int16 in volatile;\n"
                                  "var int16 a = 0;\n"

@@ -21,7 +21,9 @@ using tooltest::ssaopt;
 
 const char* const kExamples[] = {"typical_run", "controller", "procedures", "loop", "outline"};
 
-bool contains(const std::string& text, const std::string& part) { return text.find(part) != std::string::npos; }
+bool contains(const std::string& text, const std::string& part) {
+  return text.find(part) != std::string::npos;
+}
 
 bool installed(const std::string& program) {
   return std::system(("command -v " + program + " >/dev/null 2>&1").c_str()) == 0;
@@ -41,13 +43,37 @@ void expectMisuse(const std::string& arguments) {
 TEST(ToolUsage, HelpShowsEveryCommandOptionAndPass) {
   Result run = ssaopt("--help");
   EXPECT_EQ(run.status, 0);
-  for (const char* part :
-       {"usage: ssaopt [options] FILE", "ssaopt run FILE", "ssaopt check FILE", "ssaopt cc-check FILE",
-        "ssaopt reduce FILE [options] [-- COMMAND ARGUMENT...]", "ssaopt generate", "ssaopt fuzz",
-        "--passes=LIST", "--emit=FORMAT", "-o FILE", "--show-values", "--print-after-all", "--print-before=PASSES",
-        "--print-after=PASSES", "--print-changed", "--filter-procedure=NAME", "--verify", "--stats",
-        "--time-passes", "--steps=N", "--runs=R", "--seed=S", "--inputs=VALUES", "--match=TEXT", "--size=N",
-        "--programs=P", "--color=WHEN", "--help", "--version", "divide", "hoist"})
+  for (const char* part : {"usage: ssaopt [options] FILE",
+                           "ssaopt run FILE",
+                           "ssaopt check FILE",
+                           "ssaopt cc-check FILE",
+                           "ssaopt reduce FILE [options] [-- COMMAND ARGUMENT...]",
+                           "ssaopt generate",
+                           "ssaopt fuzz",
+                           "--passes=LIST",
+                           "--emit=FORMAT",
+                           "-o FILE",
+                           "--show-values",
+                           "--print-after-all",
+                           "--print-before=PASSES",
+                           "--print-after=PASSES",
+                           "--print-changed",
+                           "--filter-procedure=NAME",
+                           "--verify",
+                           "--stats",
+                           "--time-passes",
+                           "--steps=N",
+                           "--runs=R",
+                           "--seed=S",
+                           "--inputs=VALUES",
+                           "--match=TEXT",
+                           "--size=N",
+                           "--programs=P",
+                           "--color=WHEN",
+                           "--help",
+                           "--version",
+                           "divide",
+                           "hoist"})
     EXPECT_TRUE(contains(run.out, part)) << part;
 }
 
@@ -67,8 +93,8 @@ TEST(ToolUsage, AWrongCommandLineIsOneLineAndStatusTwo) {
            "--frobnicate x.ssa", "", loop + " " + loop, "--emit=pdf x.ssa", "x.ssa -o", "--verify=yes x.ssa",
            "no/such/file.ssa", std::filesystem::temp_directory_path().string(), "run no/such/file.ssa",
            "run " + loop + " --inputs no/such/values", "check " + loop + " --runs 1x",
-           "generate --seed 99999999999999999999", "check " + loop + " --steps 0", "check", "--color=blue " + loop,
-           "run - --inputs -",
+           "generate --seed 99999999999999999999", "check " + loop + " --steps 0", "check",
+           "--color=blue " + loop, "run - --inputs -",
            // Passes whose needs are not met; constant propagation before the SSA form never ended.
            "--passes=sccp " + loop, "--passes=ssa,inline " + loop, "fuzz --passes=ssa,divide,propagate",
            // Printing around a pass that does not run, or does not exist.
@@ -76,9 +102,11 @@ TEST(ToolUsage, AWrongCommandLineIsOneLineAndStatusTwo) {
            "--emit=c --filter-procedure=#main " + loop, "reduce " + loop + " --",
            "reduce " + loop + " --runs=3 -- false"})
     expectMisuse(arguments);
-  EXPECT_EQ(ssaopt("--frobnicate x.ssa").err, "ssaopt: unknown option '--frobnicate' (ssaopt --help shows the usage)\n");
-  EXPECT_EQ(ssaopt("no/such/file.ssa").err,
-            "ssaopt: cannot read 'no/such/file.ssa': No such file or directory (ssaopt --help shows the usage)\n");
+  EXPECT_EQ(ssaopt("--frobnicate x.ssa").err,
+            "ssaopt: unknown option '--frobnicate' (ssaopt --help shows the usage)\n");
+  EXPECT_EQ(
+      ssaopt("no/such/file.ssa").err,
+      "ssaopt: cannot read 'no/such/file.ssa': No such file or directory (ssaopt --help shows the usage)\n");
 }
 
 // Each option is refused, in one line, by every command that does not take it.
@@ -111,14 +139,16 @@ TEST(ToolUsage, AnOptionOfAnotherCommandIsRefused) {
   };
   for (const Option& option : kOptions)
     for (std::string command : {"", "run", "check", "cc-check", "reduce", "generate", "fuzz"}) {
-      if (std::find(option.commands.begin(), option.commands.end(), command) != option.commands.end()) continue;
+      if (std::find(option.commands.begin(), option.commands.end(), command) != option.commands.end())
+        continue;
       bool readsFile = command != "generate" && command != "fuzz";
       std::string arguments = command + " " + (readsFile ? example("loop") + " " : "") + option.spelling;
       expectMisuse(arguments);
       EXPECT_TRUE(contains(ssaopt(arguments).err, " is an option of ")) << arguments;
     }
-  EXPECT_EQ(ssaopt("run " + example("loop") + " -o out").err,
-            "ssaopt: -o is an option of the main command and reduce, not of run (ssaopt --help shows the usage)\n");
+  EXPECT_EQ(
+      ssaopt("run " + example("loop") + " -o out").err,
+      "ssaopt: -o is an option of the main command and reduce, not of run (ssaopt --help shows the usage)\n");
 }
 
 TEST(ToolUsage, AValueFollowsItsOptionAfterAnEqualsSignOrAsTheNextArgument) {
@@ -183,9 +213,11 @@ protected:
 
 TEST_F(ToolReport, ShowsEveryStepBesideTheOneBeforeWithItsPictureAndTheFigures) {
   EXPECT_EQ(m_Page.rfind("<!DOCTYPE html>", 0), 0u);
-  for (const char* step : {"the front end", "inline", "valid-conditions", "ssa", "divide", "sccp", "remove-unused",
-                           "hoist"})
-    EXPECT_TRUE(contains(m_Page, std::string(". ") + step + "<") || contains(m_Page, std::string(". ") + step + " <")) << step;
+  for (const char* step :
+       {"the front end", "inline", "valid-conditions", "ssa", "divide", "sccp", "remove-unused", "hoist"})
+    EXPECT_TRUE(contains(m_Page, std::string(". ") + step + "<") ||
+                contains(m_Page, std::string(". ") + step + " <"))
+        << step;
   EXPECT_TRUE(contains(m_Page, "<th colspan=\"2\">before inline</th><th colspan=\"2\">after inline</th>"));
   EXPECT_TRUE(contains(m_Page, "<td class=\"removed\">  call limitCommand();</td>"));
   EXPECT_TRUE(contains(m_Page, "<td class=\"added\">  if 1 goto bb26 else removed;</td>"));
@@ -200,21 +232,25 @@ TEST_F(ToolReport, ShowsEveryStepBesideTheOneBeforeWithItsPictureAndTheFigures) 
   }
   // One picture for each step that changed the program: all but three.
   std::size_t pictures = 0;
-  for (std::size_t at = m_Page.find("<svg"); at != std::string::npos; at = m_Page.find("<svg", at + 1)) ++pictures;
+  for (std::size_t at = m_Page.find("<svg"); at != std::string::npos; at = m_Page.find("<svg", at + 1))
+    ++pictures;
   EXPECT_EQ(pictures, 8u);
 }
 
 // Loads the page in a headless browser: it must render and its script run to its end without errors.
 TEST_F(ToolReport, RendersInABrowserWithoutScriptErrors) {
-  std::string browser = installed("chromium") ? "chromium" : installed("chromium-browser") ? "chromium-browser" : "";
+  std::string browser = installed("chromium")           ? "chromium"
+                        : installed("chromium-browser") ? "chromium-browser"
+                                                        : "";
   if (browser.empty()) GTEST_SKIP() << "Chromium is not installed";
   std::string profile = pathOf("profile");
   std::filesystem::remove_all(profile);
-  std::string command = browser +
-                        " --headless --no-sandbox --disable-gpu --no-first-run --disable-background-networking"
-                        " --disable-component-update --disable-sync --user-data-dir='" + profile +
-                        "' --enable-logging=stderr --v=0 --dump-dom 'file://" + m_Path + "' >'" +
-                        pathOf("dom") + "' 2>'" + pathOf("console") + "'";
+  std::string command =
+      browser +
+      " --headless --no-sandbox --disable-gpu --no-first-run --disable-background-networking"
+      " --disable-component-update --disable-sync --user-data-dir='" +
+      profile + "' --enable-logging=stderr --v=0 --dump-dom 'file://" + m_Path + "' >'" + pathOf("dom") +
+      "' 2>'" + pathOf("console") + "'";
   ASSERT_EQ(std::system(command.c_str()), 0) << contentsOf(pathOf("console"));
   std::string dom = contentsOf(pathOf("dom")), console = contentsOf(pathOf("console"));
   std::filesystem::remove_all(profile);

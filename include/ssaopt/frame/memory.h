@@ -49,9 +49,13 @@ struct ModuleAllocator {
   void deallocate(T* p, std::size_t) noexcept { moduleFree(p); }
 
   template <class U>
-  bool operator==(const ModuleAllocator<U>&) const noexcept { return true; }
+  bool operator==(const ModuleAllocator<U>&) const noexcept {
+    return true;
+  }
   template <class U>
-  bool operator!=(const ModuleAllocator<U>&) const noexcept { return false; }
+  bool operator!=(const ModuleAllocator<U>&) const noexcept {
+    return false;
+  }
 };
 
 namespace detail {

@@ -91,7 +91,7 @@ void reportConsistencyFailure(const char* file, int line, const char* condition)
 // Checks an internal consistency condition while ShowInternalInfo() is true. `text` is the condition
 // as the module reports it, `file` and `line` name where it stands. The expression is not evaluated
 // while the switch is off.
-#define KV_CONSISTENCY_CHECK(expr, text, file, line)                          \
-  do {                                                                        \
+#define KV_CONSISTENCY_CHECK(expr, text, file, line)                                         \
+  do {                                                                                       \
     if (ShowInternalInfo() && !(expr)) ::ssaopt::reportConsistencyFailure(file, line, text); \
   } while (0)

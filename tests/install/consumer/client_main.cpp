@@ -5,17 +5,17 @@
 // `client_consumer own-controller` installs a pool controller of its own; without it the module's own
 // pool serves, from boot() to shutdown(). Either way nothing may leak (the install check runs both
 // under valgrind).
-#include <cstdio>
-#include <cstring>
-#include <memory>
-#include <string>
-
 #include <ssaopt/client/c_emitter.h>
 #include <ssaopt/client/front_end.h>
 #include <ssaopt/client/interpreter.h>
 #include <ssaopt/client/pipeline.h>
 #include <ssaopt/client/printer.h>
 #include <ssaopt/ssaopt.h>
+
+#include <cstdio>
+#include <cstring>
+#include <memory>
+#include <string>
 
 namespace {
 
