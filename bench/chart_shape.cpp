@@ -25,10 +25,6 @@ constexpr std::size_t kMinimumArms = 10;
 constexpr int kSubStates = 6;
 constexpr int kSubStateVariables = 8;  // arm i keeps its sub-state in sub(i % 8)
 constexpr int kDuringActions = 6;
-constexpr int kInputs = 8;
-constexpr int kTemporaries = 16;
-constexpr int kStates = 8;
-constexpr int kOutputs = 4;
 
 void declareVariables(std::ostringstream& out) {
   declareNumbered(out, kInputs, "int16", "in", " scale(0.01) volatile");
@@ -41,10 +37,10 @@ void declareVariables(std::ostringstream& out) {
   declareNumbered(out, kOutputs, "int16", "out", " scale(0.1) saturate(0..100) output = 0");
 }
 
-class ChartWriter {
+class ChartWriter : ControllerNames {
 public:
   ChartWriter(std::ostringstream& out, Random& random, std::size_t arms)
-      : m_Text(out), m_Random(random), m_Arms(arms) {}
+      : ControllerNames(random), m_Text(out), m_Arms(arms) {}
 
   std::size_t write(std::size_t statements) {
     m_Text.line("extern read_inputs modifies(in0, in1, in2, in3, in4, in5, in6, in7, mode);");
@@ -113,13 +109,7 @@ private:
     }
   }
 
-  std::string input() { return "in" + std::to_string(m_Random.below(kInputs)); }
-  std::string temp() { return "t" + std::to_string(m_Random.below(kTemporaries)); }
-  std::string state() { return "s" + std::to_string(m_Random.below(kStates)); }
-  std::string output() { return "out" + std::to_string(m_Random.below(kOutputs)); }
-
   BodyText m_Text;
-  Random& m_Random;
   std::size_t m_Arms;
 };
 

@@ -9,10 +9,6 @@ namespace ssaopt::bench {
 
 namespace {
 
-constexpr int kInputs = 8;
-constexpr int kTemporaries = 16;
-constexpr int kStates = 8;
-constexpr int kOutputs = 4;
 constexpr int kCounters = 4;
 constexpr int kFlags = 4;
 constexpr int kSettings = 4;
@@ -34,9 +30,9 @@ void declareVariables(std::ostringstream& out) {
 
 // Writes the body of one procedure: straight-line arithmetic on scaled and saturated variables, with
 // if/else diamonds, branches on constants, bounded loops and the calls it is given, in the middle.
-class BodyWriter {
+class BodyWriter : ControllerNames {
 public:
-  BodyWriter(std::ostringstream& out, Random& random) : m_Text(out), m_Random(random) {}
+  BodyWriter(std::ostringstream& out, Random& random) : ControllerNames(random), m_Text(out) {}
 
   // Returns the statements written.
   std::size_t write(std::size_t budget, bool readsParameter, const std::vector<std::string>& calls) {
@@ -132,13 +128,8 @@ private:
   void line(const std::string& statement) { m_Text.line(statement); }
   void open(const std::string& name) { m_Text.open(name); }
   std::string label() { return m_Text.label(); }
-  std::string input() { return "in" + std::to_string(m_Random.below(kInputs)); }
-  std::string temp() { return "t" + std::to_string(m_Random.below(kTemporaries)); }
-  std::string state() { return "s" + std::to_string(m_Random.below(kStates)); }
-  std::string output() { return "out" + std::to_string(m_Random.below(kOutputs)); }
 
   BodyText m_Text;
-  Random& m_Random;
 };
 
 // A procedure reads its parameter u when it has one; arguments read temporaries only.

@@ -49,6 +49,26 @@ private:
   int m_Labels = 0;
 };
 
+// The variables that the controller-like shapes share (inputs in0.., temporaries t0.., states s0..,
+// outputs out0..) and a writer's random picks among them.
+constexpr int kInputs = 8;
+constexpr int kTemporaries = 16;
+constexpr int kStates = 8;
+constexpr int kOutputs = 4;
+
+class ControllerNames {
+public:
+  explicit ControllerNames(Random& random) : m_Random(random) {}
+
+  std::string input() { return "in" + std::to_string(m_Random.below(kInputs)); }
+  std::string temp() { return "t" + std::to_string(m_Random.below(kTemporaries)); }
+  std::string state() { return "s" + std::to_string(m_Random.below(kStates)); }
+  std::string output() { return "out" + std::to_string(m_Random.below(kOutputs)); }
+
+protected:
+  Random& m_Random;
+};
+
 inline void declareNumbered(std::ostringstream& out, int count, const char* type, const std::string& name,
                             const char* attributes) {
   for (int i = 0; i < count; ++i) out << "var " << type << " " << name << i << attributes << ";\n";

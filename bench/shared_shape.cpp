@@ -25,8 +25,6 @@ constexpr int kModuleVariables = 64;
 constexpr int kWindow = 16;  // the module variables that one procedure reads and writes
 constexpr int kStride = 3;   // how far the window of procedure j + 1 lies after that of j
 constexpr int kPool = 32;    // variables that all modules share
-constexpr int kInputs = 8;
-constexpr int kOutputs = 4;
 
 // Four kinds of variables take turns: scaled, saturated, Boolean and small unsigned integers.
 const char* const kModuleVariableKinds[] = {"int16 %s scale(0.01) erasable = 0",

@@ -12,12 +12,7 @@ set -euo pipefail
 json=${1:?usage: plot-code-size.sh CODE_SIZE_JSON [PNG]}
 png=${2:-"$(dirname "$0")/../docs/code-size.png"}
 
-if ! command -v gnuplot > /dev/null; then
-  sudo_cmd=()
-  [ "$(id -u)" -eq 0 ] || sudo_cmd=(sudo)
-  "${sudo_cmd[@]}" apt-get update -qq
-  DEBIAN_FRONTEND=noninteractive "${sudo_cmd[@]}" apt-get install -y -qq gnuplot-nox
-fi
+bash "$(dirname "$0")/need-gnuplot.sh"
 
 data=$(mktemp -d)
 trap 'rm -rf "$data"' EXIT
